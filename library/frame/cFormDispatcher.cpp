@@ -1,26 +1,81 @@
 #include "library/frame/cFormDispatcher.h"
 
+#include <vector>
+
+#include "library/frame/Forms.h"
+#include "library/frame/mdErrorHandling.h"
+#include "library/frame/mdGlobals.h"
+#include "library/frame/mdNomGlobals.h"
 #include "platform/automation/error.h"
 #include "platform/automation/variant.h"
 
 namespace PeltaNom15 {
 
-cFormDispatcher::cFormDispatcher() : m_sLibName("PeltaNom15") {}
+namespace {
 
-cFormDispatcher::~cFormDispatcher() = default;
+constexpr const char* kModule = "cFormDispatcher";
 
-std::string cFormDispatcher::LibName() { return m_sLibName; }
-
-pelta::ObjectRef cFormDispatcher::GetForm(std::string&) {
-    // No screen of the library can be created by name yet.
-    return {};
+// The loaded forms as one collection, in the order of the Forms collection.
+std::vector<pelta::Variant> loadedForms() {
+    std::vector<pelta::Variant> forms;
+    for (auto& form : Forms().Items())
+        forms.emplace_back(pelta::ObjectRef(form));
+    return {pelta::Variant(std::move(forms))};
 }
 
-int32_t cFormDispatcher::UnloadAllForms() { return 0; }
+}  // namespace
 
-void cFormDispatcher::QueryTerminate(bool&) {}
+cFormDispatcher::cFormDispatcher() : m_sLibName(kLibName) {
+    mdErrorHandling::DebugInstanceInit(kModule, m_lDebugID, this);
+}
 
-void cFormDispatcher::Terminate() {}
+cFormDispatcher::~cFormDispatcher() {
+    mdErrorHandling::DebugInstanceTerm(kModule, m_lDebugID);
+}
+
+std::string cFormDispatcher::LibName() {
+    return m_sLibName;
+}
+
+pelta::ObjectRef cFormDispatcher::GetForm(std::string& Name) {
+    try {
+        if (pelta::ObjectRef o = FormDispatcherGetForm(Name)) return o;
+        mdErrorHandling::LogError(
+            0, "Using Forms.Add for " + m_sLibName + "." + Name,
+            mdErrorHandling::FormatLocation(kModule, "IZonFormDispatcher_GetForm"), {});
+        return Forms().Add(Name);
+    } catch (...) {
+        PrintError("IZonFormDispatcher_GetForm(sForm=" + Name + ")", kModule);
+        return {};
+    }
+}
+
+int32_t cFormDispatcher::UnloadAllForms() {
+    try {
+        // Unloading shrinks the collection: walk a copy taken beforehand.
+        for (auto& form : Forms().Items())
+            form->Unload();
+        return Forms().Count();
+    } catch (...) {
+        return Forms().Count();
+    }
+}
+
+void cFormDispatcher::QueryTerminate(bool& Cancel) {
+    try {
+        std::vector<pelta::Variant> forms = loadedForms();
+        QueryTerminateObjects(Cancel, forms);
+    } catch (...) {
+    }
+}
+
+void cFormDispatcher::Terminate() {
+    try {
+        std::vector<pelta::Variant> forms = loadedForms();
+        TerminateObjects(forms);
+    } catch (...) {
+    }
+}
 
 pelta::Variant cFormDispatcher::invoke(std::string_view member, pelta::CallKind kind,
                                        std::span<pelta::Variant> args) {

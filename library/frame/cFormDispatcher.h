@@ -1,4 +1,5 @@
-// The library's entry object.
+// The library's entry object: every screen that is not a public list control
+// is obtained from it by name.
 #pragma once
 
 #include "library/contracts/IZonFormDispatcher.h"
@@ -27,6 +28,7 @@ public:
 
 private:
     std::string m_sLibName;
+    int32_t m_lDebugID = 0;
 };
 
 }  // namespace PeltaNom15
