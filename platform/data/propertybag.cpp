@@ -119,7 +119,7 @@ void PropertyBag::encode(ByteWriter& w, int depth) const {
     for (const auto& e : entries_) {
         w.str(e.name);
         try {
-            writeVariant(w, e.value, depth + 1);
+            writeVariant(w, e.value, depth + 1, /*checked=*/true);
         } catch (const Error& err) {
             raise(err.number(), err.description() + " (property \"" + e.name + "\")", err.source());
         }
@@ -134,10 +134,8 @@ void PropertyBag::decode(ByteReader& r, int depth) {
     for (size_t i = 0; i < n; ++i) {
         auto name = r.str();
         if (!isValidUtf8(name)) r.fail("property name is not UTF-8");
-        if (index_.contains(name)) r.fail("duplicate property name");
-        Variant value = readVariant(r, depth + 1);
-        entries_.push_back({std::string(name), std::move(value)});
-        index_.emplace(std::string(name), i);
+        if (!index_.try_emplace(std::string(name), i).second) r.fail("duplicate property name");
+        entries_.push_back({std::string(name), readVariant(r, depth + 1)});
     }
 }
 

@@ -87,16 +87,29 @@ bool isValidUtf8(std::string_view s) noexcept {
     auto* p = reinterpret_cast<const unsigned char*>(s.data());
     auto* end = p + s.size();
     while (p < end) {
+        // Eight ASCII bytes at a time.
+        if (end - p >= 8) {
+            uint64_t chunk;
+            std::memcpy(&chunk, p, sizeof chunk);
+            if ((chunk & 0x8080808080808080ull) == 0) {
+                p += 8;
+                continue;
+            }
+        }
         unsigned char c = *p;
         if (c < 0x80) {
             ++p;
             continue;
         }
+        // Two-byte forms (Cyrillic among them) are the common case.
+        if (c >= 0xC2 && c <= 0xDF) {
+            if (end - p < 2 || (p[1] & 0xC0) != 0x80) return false;
+            p += 2;
+            continue;
+        }
         size_t n;
         uint32_t cp;
-        if (c >= 0xC2 && c <= 0xDF) {
-            n = 1, cp = c & 0x1F;
-        } else if (c >= 0xE0 && c <= 0xEF) {
+        if (c >= 0xE0 && c <= 0xEF) {
             n = 2, cp = c & 0x0F;
         } else if (c >= 0xF0 && c <= 0xF4) {
             n = 3, cp = c & 0x07;
@@ -141,7 +154,7 @@ void checkWritable(const Variant& v, int depth) {
     }
 }
 
-void writeVariant(ByteWriter& w, const Variant& v, int depth) {
+void writeVariant(ByteWriter& w, const Variant& v, int depth, bool checked) {
     checkDepth(depth);
     switch (v.type()) {
         case VarType::Empty:
@@ -189,12 +202,12 @@ void writeVariant(ByteWriter& w, const Variant& v, int depth) {
             break;
         }
         case VarType::Date:
-            if (!dateInRange(v.rawDouble())) refuse("a date out of range");
+            if (!checked && !dateInRange(v.rawDouble())) refuse("a date out of range");
             w.u8(kDate);
             w.f64(v.rawDouble());
             break;
         case VarType::String:
-            if (!isValidUtf8(v.str())) refuse("text that is not UTF-8");
+            if (!checked && !isValidUtf8(v.str())) refuse("text that is not UTF-8");
             w.u8(kString);
             w.str(v.str());
             break;

@@ -14,8 +14,9 @@ namespace pelta {
 // row). Raises InvalidProcedureCall when the value cannot be written: an
 // object that is not Persistable, text that is not UTF-8, a date out of range,
 // or nesting deeper than kMaxPersistDepth (which also stops a bag that holds
-// itself).
-void writeVariant(ByteWriter& w, const Variant& v, int depth);
+// itself). `checked` skips the text and date checks for a value that has
+// already passed checkWritable and cannot have changed since.
+void writeVariant(ByteWriter& w, const Variant& v, int depth, bool checked = false);
 
 // Reads one value written by writeVariant. Raises InvalidData naming the byte
 // position for anything malformed, including nesting beyond kMaxPersistDepth.
