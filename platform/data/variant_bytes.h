@@ -20,6 +20,7 @@ void writeVariant(ByteWriter& w, const Variant& v, int depth, bool checked = fal
 
 // Reads one value written by writeVariant. Raises InvalidData naming the byte
 // position for anything malformed, including nesting beyond kMaxPersistDepth.
+// A PersistLoader called with `depth` reads the values it holds at depth + 1.
 Variant readVariant(ByteReader& r, int depth);
 
 // Checks, without writing, what writeVariant would refuse (objects are checked
