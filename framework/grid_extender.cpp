@@ -287,6 +287,8 @@ bool GridExtender::ValidateRows() {
             if (pending->status() != pelta::RowStatus::Deleted)
                 changed.push_back(pending->bookmark());
 
+    const pelta::Variant group = groupValue_;
+    const std::string rowFilter = rowFilter_;
     for (const auto& row : changed) {
         if (!standOn(row)) {
             // The row is hidden by the group or the quick filter: show every
@@ -299,6 +301,11 @@ bool GridExtender::ValidateRows() {
         bool cancel = false;
         raise(events_.BeforeUpdate, cancel);
         if (cancel) return false;  // the grid stands on the refused row
+    }
+    if (!(group == groupValue_) || rowFilter != rowFilter_) {
+        groupValue_ = group;
+        rowFilter_ = rowFilter;
+        applyFilter();
     }
     standOn(before);
     return true;
