@@ -10,7 +10,9 @@ namespace {
 using namespace fwtest;
 using pelta::fw::GridExtender;
 
-std::string idOfCurrent(GridExtender& g) { return g.CurrentValue("ID").toString(); }
+std::string idOfCurrent(GridExtender& g) {
+    return g.CurrentValue("ID").toString();
+}
 
 class Grid : public ::testing::Test {
 protected:
@@ -78,7 +80,7 @@ TEST_F(Grid, MoveToRowSearchesFromTheTopAndStaysWhenNothingMatches) {
 }
 
 TEST_F(Grid, BookmarksOfHiddenRowsAreNotStoodOn) {
-    g->Bind(rows);
+    g->Bind(rows, "PrName", pelta::Variant("(Всички)"));
     ASSERT_TRUE(g->MoveToRow(std::string("ID = '") + kRateUcb + "'"));
     auto ucb = g->CurrentBookmark();
     g->setGroupValue(pelta::Variant("БНБ"));
@@ -119,7 +121,9 @@ TEST_F(Grid, MarkedRows) {
 TEST_F(Grid, DeleteRowsAsksTheScreenAndMarksTheRowsDeleted) {
     g->Bind(rows);
     std::vector<pelta::Variant> offered;
-    grid->Events().BeforeDeleteEX = [&](const std::vector<pelta::Variant>& b, bool&) { offered = b; };
+    grid->Events().BeforeDeleteEX = [&](const std::vector<pelta::Variant>& b, bool&) {
+        offered = b;
+    };
     bool refuse = true;
     grid->Events().BeforeDelete = [&](bool& cancel) { cancel = refuse; };
     ASSERT_TRUE(g->MoveToRow(std::string("ID = '") + kRateBnb2 + "'"));
@@ -185,8 +189,9 @@ TEST_F(Grid, ValidateRowsVisitsChangedRowsEvenWhenHidden) {
 }
 
 TEST_F(Grid, ColumnsAndComputedValues) {
-    g->DeclareColumns({{"Bank", "Банка", "PrName"}, {"Age", "Дни", ""}, {"ID", "", "ID", false}});
-    EXPECT_THROW(g->DeclareColumns({{"A", "", "ID"}, {"a", "", "ID"}}), pelta::Error);
+    g->DeclareColumns({column("Bank", "Банка", "PrName"), column("Age", "Дни", ""),
+                       column("ID", "", "ID", false)});
+    EXPECT_THROW(g->DeclareColumns({column("A", "", "ID"), column("a", "", "ID")}), pelta::Error);
     g->Bind(rows);
     EXPECT_EQ(g->CurrentValue("Bank").toString(), "БНБ");  // through the column's field
     EXPECT_EQ(g->CurrentValue("prname").toString(), "БНБ");

@@ -76,7 +76,9 @@ private:
     std::map<std::string, bool> failing_;
 };
 
-inline BagRef bag() { return pelta::makeRef<pelta::PropertyBag>(); }
+inline BagRef bag() {
+    return pelta::makeRef<pelta::PropertyBag>();
+}
 
 inline BagRef rightsAnswer(int32_t rights) {
     auto b = bag();

@@ -55,7 +55,8 @@ TEST_F(ScreenCycle, ListFetchesFillsAndRefreshesThroughTheFramework) {
 
     // The menu as the screen left it.
     auto& f = form(list->m_oForm);
-    for (int32_t removed : {502, 202, 204, 304, 506, 103, 201}) EXPECT_EQ(f.command(removed), nullptr);
+    for (int32_t removed : {502, 202, 204, 304, 506, 103, 201})
+        EXPECT_EQ(f.command(removed), nullptr);
     ASSERT_NE(f.command(kCmdOpen), nullptr);
     EXPECT_EQ(f.command(kCmdOpen)->caption, "Редакция валутен курс...\tCtrl+O");
     EXPECT_EQ(f.command(kCmdOpen)->tooltip, "Редакция на валутен курс (Ctrl+O)");
@@ -277,8 +278,13 @@ TEST_F(ScreenCycle, RefusedSaveKeepsTheEdits) {
     f.userSetValue("txtNote", pelta::Variant("друг"));
     EXPECT_FALSE(d->m_oForm->SaveDocument());
     EXPECT_EQ(agent->last().text, "Грешка 18");
+    // Nothing was filled back over the edits.
     EXPECT_EQ(f.ControlValue("txtNote").toString(), "друг");
-    EXPECT_TRUE(f.isModified());
+    EXPECT_EQ(connection->callsOf("UpdNomCurrRatiosDetails").size(), 1u);
+    connection->fail("UpdNomCurrRatiosDetails");
+    f.userSetValue("txtNote", pelta::Variant("трети"));
+    EXPECT_FALSE(d->m_oForm->SaveDocument());
+    EXPECT_EQ(f.ControlValue("txtNote").toString(), "трети");
 }
 
 TEST_F(ScreenCycle, DetailDeleteAsksThenDeletesAndCloses) {
@@ -306,7 +312,10 @@ TEST_F(ScreenCycle, NewRecordThroughTheFramework) {
     auto& f = form(d->m_oForm);
     EXPECT_TRUE(f.documentKey().empty());
     EXPECT_TRUE(f.ControlValue("chkIsActive").toBool());
-    EXPECT_EQ(connection->callsOf("GetNomCurrRatiosDetails").back().request->readProperty("ID").toString(),
+    EXPECT_EQ(connection->callsOf("GetNomCurrRatiosDetails")
+                  .back()
+                  .request->readProperty("ID")
+                  .toString(),
               "");
 
     // In a shown document command 101 is the framework's: NewDocument, then

@@ -38,9 +38,10 @@ protected:
         return f;
     }
 
-    fs::path dir = fs::temp_directory_path() /
-                   ("pelta_fw_" + std::to_string(::testing::UnitTest::GetInstance()->random_seed()) +
-                    "_" + ::testing::UnitTest::GetInstance()->current_test_info()->name());
+    fs::path dir =
+        fs::temp_directory_path() /
+        ("pelta_fw_" + std::to_string(::testing::UnitTest::GetInstance()->random_seed()) + "_" +
+         ::testing::UnitTest::GetInstance()->current_test_info()->name());
 };
 
 TEST_F(Services, EveryIdentifierCreatesItsKindAndTheServicesAreShared) {
@@ -59,9 +60,12 @@ TEST_F(Services, EveryIdentifierCreatesItsKindAndTheServicesAreShared) {
     EXPECT_TRUE(pelta::implements<ITabExtender>(pelta::createObject(kProgIdTabExtender).get()));
     EXPECT_TRUE(pelta::implements<IQuickFilterExtender>(
         pelta::createObject(kProgIdQuickFilterExtender).get()));
-    EXPECT_TRUE(pelta::implements<IFooterExtender>(pelta::createObject(kProgIdFooterExtender).get()));
-    EXPECT_TRUE(pelta::implements<IPresetExtender>(pelta::createObject(kProgIdPresetExtender).get()));
-    EXPECT_TRUE(pelta::implements<IReportExtender>(pelta::createObject(kProgIdReportExtender).get()));
+    EXPECT_TRUE(
+        pelta::implements<IFooterExtender>(pelta::createObject(kProgIdFooterExtender).get()));
+    EXPECT_TRUE(
+        pelta::implements<IPresetExtender>(pelta::createObject(kProgIdPresetExtender).get()));
+    EXPECT_TRUE(
+        pelta::implements<IReportExtender>(pelta::createObject(kProgIdReportExtender).get()));
     EXPECT_TRUE(pelta::implements<IFieldExtender>(pelta::createObject(kProgIdFieldExtender).get()));
     EXPECT_NE(pelta::createObject(kProgIdFormExtender), pelta::createObject(kProgIdFormExtender));
 }
@@ -265,11 +269,13 @@ TEST_F(Services, MenuModel) {
 
 TEST_F(Services, DeclaredControlsHoldValues) {
     auto form = makeForm("frmControls");
-    form->DeclareControls({{"txtName", ControlKind::Text, "Име", "Name"},
-                           {"chkIsActive", ControlKind::CheckBox, "Активен", "IsActive"},
-                           {"cboBank", ControlKind::Combo, "Банка", "Pr_ID"}});
-    EXPECT_THROW(form->DeclareControls({{"TXTNAME", ControlKind::Text}}), pelta::Error);
-    EXPECT_THROW(form->DeclareControls({{"a"}, {"A"}}), pelta::Error);
+    form->DeclareControls({control("txtName", ControlKind::Text, "Име", "Name"),
+                           control("chkIsActive", ControlKind::CheckBox, "Активен", "IsActive"),
+                           control("cboBank", ControlKind::Combo, "Банка", "Pr_ID")});
+    EXPECT_THROW(form->DeclareControls({control("TXTNAME", ControlKind::Text)}), pelta::Error);
+    EXPECT_THROW(
+        form->DeclareControls({control("a", ControlKind::Text), control("A", ControlKind::Text)}),
+        pelta::Error);
     EXPECT_EQ(form->controls().size(), 3u);
     EXPECT_FALSE(form->ControlValue("chkIsActive").toBool());
     EXPECT_TRUE(form->ControlValue("txtName").isEmpty());

@@ -11,6 +11,7 @@
 #include "framework/services.h"
 #include "library/contracts/Constants.h"
 #include "library/contracts/Extenders.h"
+#include "platform/automation/error.h"
 #include "platform/automation/registry.h"
 #include "prepared_connection.h"
 
@@ -116,6 +117,26 @@ inline void serveRates(PreparedConnection& c, int32_t rights = 4 | 8 | 16 | 32) 
     c.serve("DelNomCurrRatios", bag());
 }
 
+inline ControlDecl control(std::string name, ControlKind kind, std::string caption = {},
+                           std::string field = {}) {
+    ControlDecl c;
+    c.Name = std::move(name);
+    c.Kind = kind;
+    c.Caption = std::move(caption);
+    c.Field = std::move(field);
+    return c;
+}
+
+inline ColumnDecl column(std::string key, std::string caption, std::string field,
+                         bool visible = true) {
+    ColumnDecl c;
+    c.Key = std::move(key);
+    c.Caption = std::move(caption);
+    c.Field = std::move(field);
+    c.Visible = visible;
+    return c;
+}
+
 template <class I>
 pelta::Ref<I> create(const char* progId) {
     auto o = pelta::queryRef<I>(pelta::createObject(progId));
@@ -157,17 +178,17 @@ public:
         m_oForm->SetClientSite(site.get());
         m_oForm->SetLayoutKey("{687449F9-346A-40D3-B676-908472759566}");
         m_oForm->DeclareControls({
-            {"dtpDate", ControlKind::Date, "Дата", "Date"},
-            {"chkIsActive", ControlKind::CheckBox, "Активен", "IsActive"},
-            {"cboBank", ControlKind::Combo, "Банка", "Pr_ID"},
-            {"txtNote", ControlKind::Note, "Бележка", "Note"},
-            {"geRows", ControlKind::Grid, "Курсове"},
+            control("dtpDate", ControlKind::Date, "Дата", "Date"),
+            control("chkIsActive", ControlKind::CheckBox, "Активен", "IsActive"),
+            control("cboBank", ControlKind::Combo, "Банка", "Pr_ID"),
+            control("txtNote", ControlKind::Note, "Бележка", "Note"),
+            control("geRows", ControlKind::Grid, "Курсове"),
         });
         m_oGridExt = create<IGridExtender>(kProgIdGridExtender);
         m_oGridExt->Init(this, "geRows", 2124, {});
-        m_oGridExt->DeclareColumns({{"Currency_ID", "Валута", "Currency_ID"},
-                                    {"Units", "Единици", "Units"},
-                                    {"Ratio", "Курс", "Ratio"}});
+        m_oGridExt->DeclareColumns({column("Currency_ID", "Валута", "Currency_ID"),
+                                    column("Units", "Единици", "Units"),
+                                    column("Ratio", "Курс", "Ratio")});
 
         auto& e = m_oForm->Events();
         e.Fetch = [this](int32_t step, bool& cancel) { m_oForm_Fetch(step, cancel); };
@@ -178,7 +199,9 @@ public:
         e.Save = [this](bool& cancel) { m_oForm_Save(cancel); };
         e.NewDocument = [this] { key.clear(); };
         e.BeforeExecute = [this](int32_t id, bool& handled) { m_oForm_BeforeExecute(id, handled); };
-        m_oGridExt->Events().BeforeUpdate = [this](bool& cancel) { m_oGridExt_BeforeUpdate(cancel); };
+        m_oGridExt->Events().BeforeUpdate = [this](bool& cancel) {
+            m_oGridExt_BeforeUpdate(cancel);
+        };
         return true;
     }
 
@@ -279,8 +302,8 @@ public:
         handled = true;
         if (m_oForm->AskYesNo("Желаете ли да изтриете номенклатурата?") != vbYes) return;
         auto services = create<IFrameworkServices>(kProgIdFrameworkServices);
-        if (services->RecordDeletion()->DeleteRecord(connection.get(), m_oForm.get(),
-                                                     kBllCallKind, "DelNomCurrRatios", "ID", key))
+        if (services->RecordDeletion()->DeleteRecord(connection.get(), m_oForm.get(), kBllCallKind,
+                                                     "DelNomCurrRatios", "ID", key))
             m_oForm->CloseDocument();
     }
 
@@ -325,7 +348,8 @@ public:
         m_oOpener->Init(site.get(), "{687449F9-346A-40D3-B676-908472759566}", "ctxRatios");
 
         m_oForm->Events().Fetch = [this](int32_t, bool& cancel) {
-            auto response = callService(m_oForm.get(), connection.get(), "GetNomCurrRatios", nullptr);
+            auto response =
+                callService(m_oForm.get(), connection.get(), "GetNomCurrRatios", nullptr);
             if (!response) {
                 cancel = true;
                 return;
@@ -348,7 +372,8 @@ public:
         if (!m_oOpener->HasRight(kRightOpenDetails)) return nullptr;
         auto services = create<IFrameworkServices>(kProgIdFrameworkServices);
         auto open = services->RecordDeletion()->FindDetailForm(m_oForm.get());
-        if (auto* found = pelta::query<RatiosDetails>(open.get())) return pelta::Ref<RatiosDetails>(found);
+        if (auto* found = pelta::query<RatiosDetails>(open.get()))
+            return pelta::Ref<RatiosDetails>(found);
         auto details = pelta::makeRef<RatiosDetails>();
         if (!details->frInit(site.get())) return nullptr;
         ++detailsCreated;
@@ -384,7 +409,8 @@ public:
                 handled = true;
                 m_oForm->Refresh();
                 break;
-            default: break;
+            default:
+                break;
         }
     }
 };
