@@ -73,6 +73,8 @@ public:
     void ShowCommand(int32_t CommandID, bool Visible) override;
 
     bool Refresh() override;
+    // True until a fetch succeeds (the reference lists are then held), and
+    // again after flushCache.
     bool Referentials() override { return referentials_; }
     bool SaveDocument() override;
     bool ShowDocument(const std::string& Key) override;
