@@ -328,6 +328,26 @@ TEST_F(ScreenCycle, NewRecordThroughTheFramework) {
     EXPECT_TRUE(f.documentKey().empty());
 }
 
+TEST_F(ScreenCycle, MovePositionFetchesTheKeyOfTheBookmark) {
+    auto list = openList();
+    list->m_oForm->Execute(kCmdOpen);
+    auto d = list->m_oDetails;
+    auto& f = form(d->m_oForm);
+    EXPECT_TRUE(f.movePosition(pelta::Variant(std::vector<pelta::Variant>{kRateUcb})));
+    EXPECT_EQ(d->key, kRateUcb);
+    EXPECT_EQ(f.documentKey(), kRateUcb);
+    auto fetches = connection->callsOf("GetNomCurrRatiosDetails");
+    EXPECT_EQ(fetches.back().request->readProperty("ID").toString(), kRateUcb);
+    EXPECT_FALSE(fetches.back().request->readProperty("Referentials").toBool());
+    // After the cache is flushed the reference lists are asked for again.
+    f.flushCache();
+    d->m_oForm->Refresh();
+    EXPECT_TRUE(connection->callsOf("GetNomCurrRatiosDetails")
+                    .back()
+                    .request->readProperty("Referentials")
+                    .toBool());
+}
+
 TEST_F(ScreenCycle, MissingRecordIsReportedAndCancelsTheFetch) {
     connection->serve("GetNomCurrRatiosDetails", [](const pelta::PropertyBag&) {
         auto b = bag();

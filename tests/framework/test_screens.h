@@ -198,6 +198,9 @@ public:
         e.Upload = [this] { m_oForm_Upload(); };
         e.Save = [this](bool& cancel) { m_oForm_Save(cancel); };
         e.NewDocument = [this] { key.clear(); };
+        e.MovePosition = [this](const pelta::Variant& bookmark) {
+            key = bookmark.array().at(0).toString();
+        };
         e.BeforeExecute = [this](int32_t id, bool& handled) { m_oForm_BeforeExecute(id, handled); };
         m_oGridExt->Events().BeforeUpdate = [this](bool& cancel) {
             m_oGridExt_BeforeUpdate(cancel);
