@@ -1,0 +1,60 @@
+#include "framework/framework.h"
+
+#include "framework/extenders.h"
+#include "framework/form_extender.h"
+#include "framework/grid_extender.h"
+#include "framework/record_deletion.h"
+#include "framework/services.h"
+#include "platform/automation/registry.h"
+
+namespace pelta::fw {
+
+using namespace PeltaNom15;
+
+namespace {
+
+template <class T>
+pelta::ObjectRef make() {
+    return pelta::ObjectRef(pelta::makeRef<T>());
+}
+
+struct ClassOf {
+    const char* progId;
+    pelta::ObjectRef (*create)();
+};
+
+const ClassOf kClasses[] = {
+    {kProgIdFrameworkServices, [] { return pelta::ObjectRef(FrameworkServices::instance()); }},
+    {kProgIdFormExtender, make<FormExtender>},
+    {kProgIdGridExtender, make<GridExtender>},
+    {kProgIdDetailOpener, make<DetailOpener>},
+    {kProgIdTreeExtender, make<TreeExtender>},
+    {kProgIdSplitterExtender, make<SplitterExtender>},
+    {kProgIdTabExtender, make<TabExtender>},
+    {kProgIdQuickFilterExtender, make<QuickFilterExtender>},
+    {kProgIdFooterExtender, make<FooterExtender>},
+    {kProgIdPresetExtender, make<PresetExtender>},
+    {kProgIdReportExtender, make<ReportExtender>},
+    {kProgIdFieldExtender, make<FieldExtender>},
+};
+
+}  // namespace
+
+void registerFramework() {
+    for (const auto& c : kClasses)
+        pelta::registerLocalClass(c.progId, c.create);
+}
+
+void unregisterFramework() {
+    for (const auto& c : kClasses)
+        pelta::unregisterLocalClass(c.progId);
+}
+
+std::vector<std::string> frameworkProgIds() {
+    std::vector<std::string> out;
+    for (const auto& c : kClasses)
+        out.emplace_back(c.progId);
+    return out;
+}
+
+}  // namespace pelta::fw

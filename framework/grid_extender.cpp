@@ -1,0 +1,404 @@
+#include "framework/grid_extender.h"
+
+#include <algorithm>
+
+#include "platform/automation/error.h"
+#include "platform/data/recordset.h"
+
+namespace pelta::fw {
+
+using namespace PeltaNom15;
+
+namespace {
+
+bool sameAscii(std::string_view a, std::string_view b) {
+    if (a.size() != b.size()) return false;
+    for (size_t i = 0; i < a.size(); ++i) {
+        char x = a[i], y = b[i];
+        if (x >= 'A' && x <= 'Z') x = static_cast<char>(x - 'A' + 'a');
+        if (y >= 'A' && y <= 'Z') y = static_cast<char>(y - 'A' + 'a');
+        if (x != y) return false;
+    }
+    return true;
+}
+
+// A value written as a literal of the filter grammar.
+std::string literal(const pelta::Variant& v) {
+    switch (v.type()) {
+        case pelta::VarType::Boolean:
+            return v.rawBool() ? "True" : "False";
+        case pelta::VarType::Byte:
+        case pelta::VarType::Integer:
+        case pelta::VarType::Long:
+            return std::to_string(v.toLong());
+        default:
+            break;
+    }
+    std::string text = v.toString(), out = "'";
+    for (char c : text) {
+        out += c;
+        if (c == '\'') out += '\'';
+    }
+    return out + "'";
+}
+
+bool showsAllGroups(const pelta::Variant& v) {
+    return v.isEmpty() || v.isNull() || (v.isString() && v.str() == kAllGroups);
+}
+
+}  // namespace
+
+GridExtender::GridExtender() = default;
+GridExtender::~GridExtender() = default;
+
+RecordsetRef GridExtender::Rows() {
+    return rows_;
+}
+RecordsetRef GridExtender::view() const {
+    return view_;
+}
+
+void GridExtender::Init(pelta::Object* Owner, const std::string& GridName, int32_t HelpID,
+                        const std::string& LayoutKey) {
+    setOwner(Owner);
+    gridName_ = GridName;
+    helpID_ = HelpID;
+    layoutKey_ = LayoutKey;
+}
+
+void GridExtender::DeclareColumns(const std::vector<ColumnDecl>& Columns) {
+    for (size_t i = 0; i < Columns.size(); ++i)
+        for (size_t j = 0; j < i; ++j)
+            if (Columns[i].Key.empty() || sameAscii(Columns[i].Key, Columns[j].Key))
+                pelta::raise(pelta::errc::InvalidProcedureCall,
+                             "The grid " + gridName_ + " declares the column \"" + Columns[i].Key +
+                                 "\" twice or without a key",
+                             "GridExtender.DeclareColumns");
+    columns_ = Columns;
+}
+
+// ---- binding and filters ------------------------------------------------------------
+
+void GridExtender::Bind(RecordsetRef Rows, const std::string& GroupColumn,
+                        const pelta::Variant& GroupValue) {
+    if (Rows && !GroupColumn.empty() && Rows->fieldIndex(GroupColumn) < 0)
+        pelta::raise(pelta::errc::InvalidProcedureCall,
+                     "The rows bound to " + gridName_ + " have no group column " + GroupColumn,
+                     "GridExtender.Bind");
+    rows_ = std::move(Rows);
+    groupColumn_ = GroupColumn;
+    groupValue_ = GroupValue;
+    selected_.clear();
+    view_ = rows_ ? rows_->clone() : nullptr;
+    applyFilter();
+    baseline_ = pendingRows();
+}
+
+std::string GridExtender::filterText() const {
+    std::vector<std::string> parts;
+    if (!groupColumn_.empty() && !showsAllGroups(groupValue_))
+        parts.push_back(groupColumn_ + " = " + literal(groupValue_));
+    if (!rowFilter_.empty()) parts.push_back(rowFilter_);
+    if (parts.size() == 1) return parts[0];
+    std::string out;
+    for (const auto& p : parts)
+        out += (out.empty() ? "(" : " AND (") + p + ")";
+    return out;
+}
+
+void GridExtender::applyFilter() {
+    if (!view_) return;
+    auto text = filterText();
+    if (text.empty())
+        view_->clearFilter();
+    else
+        view_->setFilter(std::string_view(text));
+    if (view_->recordCount() > 0) view_->moveFirst();
+}
+
+void GridExtender::Refresh() {
+    if (view_) {
+        pelta::Variant current = CurrentBookmark();
+        applyFilter();
+        if (!current.isEmpty()) standOn(current);
+    }
+    raise(events_.CalcTotals);
+}
+
+void GridExtender::setGroupValue(const pelta::Variant& value) {
+    groupValue_ = value;
+    selected_.clear();
+    applyFilter();
+    raise(events_.CalcTotals);
+}
+
+void GridExtender::setRowFilter(const std::string& criteria) {
+    rowFilter_ = criteria;
+    selected_.clear();
+    applyFilter();
+    raise(events_.CalcTotals);
+}
+
+std::vector<pelta::Variant> GridExtender::groupValues() {
+    std::vector<pelta::Variant> out{pelta::Variant(kAllGroups)};
+    if (!rows_ || groupColumn_.empty()) return out;
+    auto all = rows_->clone();
+    all->clearFilter();
+    if (all->recordCount() == 0) return out;
+    for (all->moveFirst(); !all->eof(); all->moveNext()) {
+        auto v = all->value(groupColumn_);
+        if (v.isNull() || v.isEmpty()) continue;
+        if (std::find(out.begin() + 1, out.end(), v) == out.end()) out.push_back(std::move(v));
+    }
+    return out;
+}
+
+int64_t GridExtender::rowCount() {
+    return view_ ? view_->recordCount() : 0;
+}
+
+// ---- the current row ----------------------------------------------------------------
+
+bool GridExtender::HasCurrentRow() {
+    if (!view_ || view_->bof() || view_->eof()) return false;
+    return view_->status() != pelta::RowStatus::Deleted;
+}
+
+std::string GridExtender::fieldOf(const std::string& column) const {
+    for (const auto& c : columns_)
+        if (sameAscii(c.Key, column)) return c.Field;
+    return column;
+}
+
+pelta::Variant GridExtender::CurrentValue(const std::string& Column) {
+    if (!HasCurrentRow()) return {};
+    auto field = fieldOf(Column);
+    if (!field.empty() && view_->fieldIndex(field) >= 0) return view_->value(field);
+    bool declared = std::any_of(columns_.begin(), columns_.end(),
+                                [&](const ColumnDecl& c) { return sameAscii(c.Key, Column); });
+    if (!declared)
+        pelta::raise(pelta::errc::InvalidProcedureCall,
+                     "The grid " + gridName_ + " has no column " + Column,
+                     "GridExtender.CurrentValue");
+    pelta::Variant value;
+    raise(events_.FetchData, view_->bookmark(), Column, value);
+    return value;
+}
+
+pelta::Variant GridExtender::CurrentBookmark() {
+    if (!HasCurrentRow()) return {};
+    return view_->bookmark();
+}
+
+bool GridExtender::standOn(const pelta::Variant& bookmark) {
+    if (!view_ || bookmark.isEmpty()) return false;
+    pelta::Variant before = CurrentBookmark();
+    try {
+        view_->setBookmark(bookmark);
+        if (!view_->bof() && !view_->eof()) return true;
+    } catch (const pelta::Error&) {
+    }
+    // Not a row of the grid: stay where the grid stood.
+    try {
+        if (!before.isEmpty())
+            view_->setBookmark(before);
+        else if (view_->recordCount() > 0)
+            view_->moveFirst();
+    } catch (const pelta::Error&) {
+    }
+    return false;
+}
+
+bool GridExtender::SetCurrentBookmark(const pelta::Variant& Bookmark) {
+    pelta::Variant before = CurrentBookmark();
+    if (!standOn(Bookmark)) return false;
+    if (!(before == Bookmark)) raise(events_.RowColChange, before, std::string());
+    return true;
+}
+
+bool GridExtender::MoveToRow(const std::string& Criterion) {
+    if (!view_ || view_->recordCount() == 0) return false;
+    pelta::Variant before = CurrentBookmark();
+    bool found = false;
+    try {
+        view_->moveFirst();
+        found = view_->find(Criterion);
+    } catch (...) {
+        standOn(before);
+        throw;
+    }
+    if (!found) {
+        if (!standOn(before)) view_->moveFirst();
+        return false;
+    }
+    if (!(before == view_->bookmark())) raise(events_.RowColChange, before, std::string());
+    return true;
+}
+
+// ---- marked rows --------------------------------------------------------------------
+
+void GridExtender::SetMultiSelect(bool MultiSelect) {
+    multiSelect_ = MultiSelect;
+    if (!multiSelect_ && selected_.size() > 1)
+        selected_.erase(selected_.begin(), selected_.end() - 1);
+}
+
+void GridExtender::SetSelectedBookmarks(const std::vector<pelta::Variant>& Bookmarks) {
+    std::vector<pelta::Variant> marks;
+    if (multiSelect_)
+        marks = Bookmarks;
+    else if (!Bookmarks.empty())
+        marks.push_back(Bookmarks.back());
+    if (marks == selected_) return;
+    selected_ = std::move(marks);
+    raise(events_.SelectionChange);
+}
+
+// ---- edits --------------------------------------------------------------------------
+
+std::set<double> GridExtender::pendingRows() const {
+    std::set<double> out;
+    if (!rows_) return out;
+    auto pending = rows_->clone();
+    pending->setFilter(pelta::FilterGroup::Pending);
+    if (pending->recordCount() == 0) return out;
+    for (pending->moveFirst(); !pending->eof(); pending->moveNext())
+        out.insert(pending->bookmark().toDouble());
+    return out;
+}
+
+bool GridExtender::EditState() {
+    if (view_ && view_->editMode() != pelta::EditMode::None) return true;
+    for (double row : pendingRows())
+        if (!baseline_.count(row)) return true;
+    return false;
+}
+
+bool GridExtender::ValidateRows() {
+    if (!view_) return true;
+    if (view_->editMode() != pelta::EditMode::None) view_->update();
+    pelta::Variant before = CurrentBookmark();
+
+    std::vector<pelta::Variant> changed;
+    auto pending = rows_->clone();
+    pending->setFilter(pelta::FilterGroup::Pending);
+    if (pending->recordCount() > 0)
+        for (pending->moveFirst(); !pending->eof(); pending->moveNext())
+            if (pending->status() != pelta::RowStatus::Deleted)
+                changed.push_back(pending->bookmark());
+
+    const pelta::Variant group = groupValue_;
+    const std::string rowFilter = rowFilter_;
+    for (const auto& row : changed) {
+        if (!standOn(row)) {
+            // The row is hidden by the group or the quick filter: show every
+            // row so that the grid can stand on it.
+            groupValue_ = pelta::Variant(kAllGroups);
+            rowFilter_.clear();
+            applyFilter();
+            if (!standOn(row)) continue;
+        }
+        bool cancel = false;
+        raise(events_.BeforeUpdate, cancel);
+        if (cancel) return false;  // the grid stands on the refused row
+    }
+    if (!(group == groupValue_) || rowFilter != rowFilter_) {
+        groupValue_ = group;
+        rowFilter_ = rowFilter;
+        applyFilter();
+    }
+    standOn(before);
+    return true;
+}
+
+bool GridExtender::DeleteRows() {
+    if (!view_) return false;
+    std::vector<pelta::Variant> targets = selected_;
+    if (targets.empty() && HasCurrentRow()) targets.push_back(CurrentBookmark());
+    if (targets.empty()) return false;
+    bool cancel = false;
+    raise(events_.BeforeDeleteEX, targets, cancel);
+    if (!cancel) raise(events_.BeforeDelete, cancel);
+    if (cancel) return false;
+    for (const auto& row : targets)
+        if (standOn(row)) view_->deleteRecord();
+    selected_.clear();
+    applyFilter();
+    raise(events_.AfterDelete);
+    return true;
+}
+
+bool GridExtender::editCell(const std::string& column, const pelta::Variant& value) {
+    if (!HasCurrentRow()) return false;
+    auto field = fieldOf(column);
+    if (field.empty() || view_->fieldIndex(field) < 0)
+        pelta::raise(pelta::errc::InvalidProcedureCall,
+                     "The column " + column + " of " + gridName_ + " cannot be edited",
+                     "GridExtender.editCell");
+    pelta::Variant old = view_->value(field);
+    bool cancel = false;
+    raise(events_.BeforeColUpdate, column, old, cancel);
+    if (cancel) return false;
+    view_->setValue(field, value);
+    raise(events_.AfterColUpdate, column);
+    return true;
+}
+
+void GridExtender::addRow() {
+    if (!view_)
+        pelta::raise(pelta::errc::ObjectVariableNotSet, "No rows are bound to " + gridName_);
+    view_->addNew();
+}
+
+bool GridExtender::commitRow() {
+    if (!view_ || view_->editMode() == pelta::EditMode::None) return true;
+    bool cancel = false;
+    raise(events_.BeforeUpdate, cancel);
+    if (cancel) return false;
+    view_->update();
+    raise(events_.AfterUpdate);
+    return true;
+}
+
+// ---- user actions -------------------------------------------------------------------
+
+bool GridExtender::columnVisible(const std::string& column) {
+    bool show = true;
+    for (const auto& c : columns_)
+        if (sameAscii(c.Key, column)) show = c.Visible;
+    raise(events_.CanShowColumn, column, show);
+    return show;
+}
+
+RowFormatArgs GridExtender::formatRow(const pelta::Variant& bookmark) {
+    RowFormatArgs args;
+    args.Bookmark = bookmark;
+    raise(events_.RowFormat, args);
+    return args;
+}
+
+bool GridExtender::execute(int32_t commandID) {
+    bool handled = false;
+    raise(events_.BeforeExecute, commandID, handled);
+    return handled;
+}
+
+void GridExtender::doubleClick() {
+    raise(events_.DblClick);
+}
+
+bool GridExtender::canOpen() {
+    bool cancel = false;
+    raise(events_.CanOpen, cancel);
+    return !cancel;
+}
+
+void GridExtender::negotiateMenu() {
+    raise(events_.MenuNegotiateEx);
+}
+
+void GridExtender::addFromSelector(const pelta::Variant& selection) {
+    raise(events_.AddFromSelector, selection);
+}
+
+}  // namespace pelta::fw

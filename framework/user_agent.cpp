@@ -1,0 +1,154 @@
+#include "framework/user_agent.h"
+
+#include <algorithm>
+
+#include "framework/services.h"
+#include "library/contracts/Constants.h"
+
+namespace pelta::fw {
+
+using namespace PeltaNom15;
+
+std::vector<int32_t> buttonsOfStyle(int32_t style) {
+    switch (style & 0x0F) {
+        case vbOKCancel:
+            return {vbOK, vbCancel};
+        case vbAbortRetryIgnore:
+            return {vbAbort, vbRetry, vbIgnore};
+        case vbYesNoCancel:
+            return {vbYes, vbNo, vbCancel};
+        case vbYesNo:
+            return {vbYes, vbNo};
+        case vbRetryCancel:
+            return {vbRetry, vbCancel};
+        default:
+            return {vbOK};
+    }
+}
+
+bool isQuestion(int32_t style) {
+    return buttonsOfStyle(style).size() > 1;
+}
+
+namespace {
+
+std::string describe(const Prompt& p) {
+    std::string kind = p.kind == PromptKind::InputBox ? "input box" : "question";
+    return kind + " \"" + p.text + "\" (style " + std::to_string(p.style) + ", caption \"" +
+           p.caption + "\")";
+}
+
+}  // namespace
+
+ScriptedUserAgent& ScriptedUserAgent::answer(int32_t button, std::string expectText) {
+    std::lock_guard lock(mutex_);
+    answers_.push_back(Answer{false, button, std::nullopt, std::move(expectText)});
+    return *this;
+}
+
+ScriptedUserAgent& ScriptedUserAgent::answerInput(pelta::Variant value, std::string expectText) {
+    std::lock_guard lock(mutex_);
+    answers_.push_back(Answer{true, 0, std::move(value), std::move(expectText)});
+    return *this;
+}
+
+ScriptedUserAgent& ScriptedUserAgent::cancelInput(std::string expectText) {
+    std::lock_guard lock(mutex_);
+    answers_.push_back(Answer{true, 0, std::nullopt, std::move(expectText)});
+    return *this;
+}
+
+ScriptedUserAgent::Answer ScriptedUserAgent::takeAnswer(const Prompt& prompt, bool input) {
+    // Called with the mutex held; the prompt is already recorded.
+    auto refuse = [&](const std::string& why) -> Answer {
+        unscripted_.push_back(prompt);
+        throw UnscriptedPrompt(why + ": " + describe(prompt));
+    };
+    if (answers_.empty()) refuse("No answer was scripted for the " + describe(prompt));
+    Answer a = answers_.front();
+    if (a.input != input)
+        refuse(std::string("The next scripted answer is for ") +
+               (a.input ? "an input box" : "a question") + ", not for this");
+    if (!a.expectText.empty() && prompt.text.find(a.expectText) == std::string::npos)
+        refuse("The scripted answer expected a text containing \"" + a.expectText + "\"");
+    if (!input) {
+        auto buttons = buttonsOfStyle(prompt.style);
+        if (std::find(buttons.begin(), buttons.end(), a.button) == buttons.end())
+            refuse("The scripted button " + std::to_string(a.button) + " is not offered");
+    }
+    answers_.pop_front();
+    return a;
+}
+
+int32_t ScriptedUserAgent::messageBox(const Prompt& prompt) {
+    std::lock_guard lock(mutex_);
+    prompts_.push_back(prompt);
+    if (!isQuestion(prompt.style)) return vbOK;
+    return takeAnswer(prompt, false).button;
+}
+
+void ScriptedUserAgent::anchoredMessage(const Prompt& prompt) {
+    std::lock_guard lock(mutex_);
+    prompts_.push_back(prompt);
+}
+
+std::optional<pelta::Variant> ScriptedUserAgent::inputBox(const Prompt& prompt) {
+    std::lock_guard lock(mutex_);
+    prompts_.push_back(prompt);
+    return takeAnswer(prompt, true).value;
+}
+
+std::vector<Prompt> ScriptedUserAgent::prompts() const {
+    std::lock_guard lock(mutex_);
+    return prompts_;
+}
+
+std::vector<std::string> ScriptedUserAgent::texts() const {
+    std::lock_guard lock(mutex_);
+    std::vector<std::string> out;
+    for (const auto& p : prompts_)
+        out.push_back(p.text);
+    return out;
+}
+
+Prompt ScriptedUserAgent::last() const {
+    std::lock_guard lock(mutex_);
+    if (prompts_.empty()) throw std::logic_error("Nothing was shown to the user");
+    return prompts_.back();
+}
+
+size_t ScriptedUserAgent::pending() const {
+    std::lock_guard lock(mutex_);
+    return answers_.size();
+}
+
+std::vector<Prompt> ScriptedUserAgent::unscripted() const {
+    std::lock_guard lock(mutex_);
+    return unscripted_;
+}
+
+void ScriptedUserAgent::clear() {
+    std::lock_guard lock(mutex_);
+    answers_.clear();
+    prompts_.clear();
+    unscripted_.clear();
+}
+
+namespace {
+thread_local pelta::Ref<UserAgent> t_agent;
+}
+
+pelta::Ref<UserAgent> currentUserAgent() {
+    if (t_agent) return t_agent;
+    return FrameworkServices::instance()->userAgent();
+}
+
+UserAgentScope::UserAgentScope(pelta::Ref<UserAgent> agent) : previous_(std::move(t_agent)) {
+    t_agent = std::move(agent);
+}
+
+UserAgentScope::~UserAgentScope() {
+    t_agent = std::move(previous_);
+}
+
+}  // namespace pelta::fw

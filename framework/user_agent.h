@@ -1,0 +1,126 @@
+// The user agent: whoever answers the screens' message boxes, questions and
+// input boxes. Every prompt a screen shows goes through the framework to the
+// agent of the calling thread. In tests a scripted agent answers from a queue
+// and records every prompt; in the web shell an agent per browser session
+// shows the prompt and blocks the session's user-interface thread until the
+// person answers.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <deque>
+#include <mutex>
+#include <optional>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+#include "platform/automation/object.h"
+#include "platform/automation/variant.h"
+
+namespace pelta::fw {
+
+enum class PromptKind {
+    MessageBox,  // text, style, caption, details; answers a button
+    Anchored,    // a message shown at a control, with title and hint
+    InputBox,    // prompt and title; answers a value or cancel
+};
+
+struct Prompt {
+    PromptKind kind = PromptKind::MessageBox;
+    std::string text;
+    int32_t style = 0;  // message boxes: vbYesNo + vbQuestion ...
+    std::string caption;
+    std::string details;
+    std::string control;   // anchored messages
+    std::string title;     // anchored messages and input boxes
+    std::string hint;      // anchored messages
+    pelta::Variant value;  // input boxes: the default offered
+};
+
+// The buttons a message-box style offers (vbOK, vbYes ...), in order.
+std::vector<int32_t> buttonsOfStyle(int32_t style);
+// True when the style offers a choice (more than the OK button).
+bool isQuestion(int32_t style);
+
+class UserAgent : public virtual pelta::Object {
+public:
+    // Shows a message box; answers the button pressed.
+    virtual int32_t messageBox(const Prompt& prompt) = 0;
+    // Shows a message at a control; nothing to answer.
+    virtual void anchoredMessage(const Prompt& prompt) = 0;
+    // Asks for a value; nullopt when cancelled.
+    virtual std::optional<pelta::Variant> inputBox(const Prompt& prompt) = 0;
+};
+
+// Thrown by the scripted agent when a screen asks what the test did not
+// script, or a scripted answer does not fit the question. Deliberately not a
+// pelta::Error, so that a screen's error handling does not mistake it for an
+// error of its own.
+class UnscriptedPrompt : public std::logic_error {
+public:
+    using std::logic_error::logic_error;
+};
+
+// Answers in the order scripted; records every prompt. A message box without
+// a choice (OK only) answers OK by itself, and an anchored message needs no
+// answer; a question or an input box without a scripted answer throws
+// UnscriptedPrompt (and is remembered in unscripted(), in case a screen
+// swallows the exception).
+class ScriptedUserAgent : public UserAgent {
+public:
+    // The next question is answered with `button`; when `expectText` is given
+    // the question's text must contain it.
+    ScriptedUserAgent& answer(int32_t button, std::string expectText = {});
+    // The next input box is answered with `value` (or cancelled).
+    ScriptedUserAgent& answerInput(pelta::Variant value, std::string expectText = {});
+    ScriptedUserAgent& cancelInput(std::string expectText = {});
+
+    int32_t messageBox(const Prompt& prompt) override;
+    void anchoredMessage(const Prompt& prompt) override;
+    std::optional<pelta::Variant> inputBox(const Prompt& prompt) override;
+
+    // Everything shown, in order.
+    std::vector<Prompt> prompts() const;
+    // The texts shown, in order.
+    std::vector<std::string> texts() const;
+    // The last prompt; throws when nothing was shown.
+    Prompt last() const;
+    size_t pending() const;  // scripted answers not used yet
+    std::vector<Prompt> unscripted() const;
+    void clear();  // forgets prompts and answers
+
+private:
+    struct Answer {
+        bool input = false;
+        int32_t button = 0;
+        std::optional<pelta::Variant> value;
+        std::string expectText;
+    };
+    Answer takeAnswer(const Prompt& prompt, bool input);
+
+    mutable std::mutex mutex_;
+    std::deque<Answer> answers_;
+    std::vector<Prompt> prompts_;
+    std::vector<Prompt> unscripted_;
+};
+
+// The agent prompts of the calling thread go to: the thread's own (see
+// UserAgentScope) when set, else the process-wide one of the framework
+// services. Null when neither is set.
+pelta::Ref<UserAgent> currentUserAgent();
+
+// Sets the calling thread's agent for the scope's lifetime (a browser
+// session's user-interface thread; a test).
+class UserAgentScope {
+public:
+    explicit UserAgentScope(pelta::Ref<UserAgent> agent);
+    ~UserAgentScope();
+    UserAgentScope(const UserAgentScope&) = delete;
+    UserAgentScope& operator=(const UserAgentScope&) = delete;
+
+private:
+    pelta::Ref<UserAgent> previous_;
+};
+
+}  // namespace pelta::fw
