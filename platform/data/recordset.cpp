@@ -325,9 +325,63 @@ bool visible(const Table& t, const View& v, uint32_t r) {
     return st != kDeleted;
 }
 
+// Rebuilds the view from its filter and sort; the cursor on the first row.
+void rebuild(const Table& t, View& v) {
+    std::vector<uint32_t> base;
+    base.reserve(t.slots());
+    if (v.sorted) {
+        for (uint32_t r : v.sortOrder)
+            if (visible(t, v, r)) base.push_back(r);
+    } else {
+        for (uint32_t r = 0; r < t.slots(); ++r)
+            if (visible(t, v, r)) base.push_back(r);
+    }
+    std::vector<uint32_t> ids;
+    switch (v.kind) {
+        case FilterKind::None:
+        case FilterKind::Pending:
+            ids.swap(base);
+            break;
+        case FilterKind::Criteria:
+            ids.reserve(base.size() / 4);
+            v.compiled->select(t, base, ids);
+            break;
+        case FilterKind::Bookmarks: {
+            std::vector<uint8_t> want(t.slots());
+            for (const Variant& bm : v.bookmarkList) {
+                uint32_t r;
+                if (bookmarkRow(t, bm, r)) want[r] = 1;
+            }
+            for (uint32_t r : base)
+                if (want[r]) ids.push_back(r);
+            break;
+        }
+    }
+    v.ids.swap(ids);
+    v.slotsSeen = t.slots();
+    v.epochSeen = t.epoch;
+    v.resetSeen = t.resetEpoch;
+    v.compact = true;
+    v.posValid = false;
+    v.ghost = false;
+    v.pos = 0;
+}
+
+int64_t positionOf(const Table& t, View& v, uint32_t row);
+
 // Takes in rows added through other recordsets over the same table, and
-// notes removals.
+// notes removals; after rows came back, rebuilds keeping the current row.
 void sync(const Table& t, View& v) {
+    if (v.resetSeen != t.resetEpoch) {
+        const bool onRow = !v.ghost && v.pos >= 0 && v.pos < static_cast<int64_t>(v.ids.size());
+        const uint32_t row = onRow ? v.ids[static_cast<size_t>(v.pos)] : 0;
+        rebuild(t, v);
+        if (onRow && visible(t, v, row)) {
+            int64_t p = positionOf(t, v, row);
+            if (p >= 0) v.pos = p;
+        }
+        return;
+    }
     if (v.slotsSeen < t.slots()) {
         const bool atEof = v.pos >= static_cast<int64_t>(v.ids.size());
         for (uint32_t r = v.slotsSeen; r < t.slots(); ++r) {
@@ -819,50 +873,13 @@ void Recordset::cancelBatch() {
     }
     t.originals.clear();
     ++t.epoch;
+    ++t.resetEpoch;
 }
 
 // --- Filter, sort, find, clone ----------------------------------------------
 
 void Recordset::rebuildView() {
-    const Table& t = *table_;
-    View& v = *view_;
-    std::vector<uint32_t> base;
-    base.reserve(t.slots());
-    if (v.sorted) {
-        for (uint32_t r : v.sortOrder)
-            if (visible(t, v, r)) base.push_back(r);
-    } else {
-        for (uint32_t r = 0; r < t.slots(); ++r)
-            if (visible(t, v, r)) base.push_back(r);
-    }
-    std::vector<uint32_t> ids;
-    switch (v.kind) {
-        case FilterKind::None:
-        case FilterKind::Pending:
-            ids.swap(base);
-            break;
-        case FilterKind::Criteria:
-            ids.reserve(base.size() / 4);
-            v.compiled->select(t, base, ids);
-            break;
-        case FilterKind::Bookmarks: {
-            std::vector<uint8_t> want(t.slots());
-            for (const Variant& bm : v.bookmarkList) {
-                uint32_t r;
-                if (bookmarkRow(t, bm, r)) want[r] = 1;
-            }
-            for (uint32_t r : base)
-                if (want[r]) ids.push_back(r);
-            break;
-        }
-    }
-    v.ids.swap(ids);
-    v.slotsSeen = t.slots();
-    v.epochSeen = t.epoch;
-    v.compact = true;
-    v.posValid = false;
-    v.ghost = false;
-    v.pos = 0;
+    rebuild(*table_, *view_);
 }
 
 void Recordset::setFilter(std::string_view criteria) {

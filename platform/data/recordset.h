@@ -174,6 +174,8 @@ public:
 
     // --- Filter and sort. Setting either puts the cursor on the first row. ---
     void setFilter(std::string_view criteria);
+    void setFilter(const char* criteria) { setFilter(std::string_view(criteria)); }
+    void setFilter(const std::string& criteria) { setFilter(std::string_view(criteria)); }
     void setFilter(FilterGroup group);
     void setFilter(std::span<const Variant> bookmarks);
     // A String (criteria), a number (FilterGroup), an Array of bookmarks, or

@@ -77,6 +77,8 @@ struct Table {
     // Bumped whenever a row leaves or re-enters the visible set (delete,
     // batch accept/cancel, cancel of an added row), so views re-check.
     uint64_t epoch = 0;
+    // Bumped when rows come back (batch cancel): views rebuild from scratch.
+    uint64_t resetEpoch = 0;
     // Decimal fields: 10^(precision-scale), the first magnitude that does not fit.
     std::vector<Decimal> decimalLimit;
 
@@ -111,6 +113,7 @@ struct View {
     int64_t pos = 0;            // -1: BOF; ids.size(): EOF
     bool ghost = false;         // current row vanished: logically just before ids[pos]
     uint64_t epochSeen = 0;
+    uint64_t resetSeen = 0;
     uint32_t slotsSeen = 0;
     bool compact = true;  // every row of ids is visible
 
