@@ -25,7 +25,8 @@ Ref<Recordset> makeData() {
     rs->appendField("Pic", FieldType::Binary);
     rs->appendField("Item Name", FieldType::Text);
     rs->open();
-    const char* names[] = {"Иван", "иван", "IVAN", "Kelvin \u212A", "long \u017F", "O'Brien", "", "Ябълка"};
+    const char* names[] = {"Иван",        "иван",    "IVAN", "Kelvin \u212A",
+                           "long \u017F", "O'Brien", "",     "Ябълка"};
     for (int i = 0; i < 16; ++i) {
         rs->addNew();
         if (i % 5 == 4) continue;  // a row of Nulls
@@ -52,7 +53,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     std::string_view text(reinterpret_cast<const char*>(data), size);
     try {
         rs->setFilter(text);
-        for (rs->moveFirst(); !rs->eof(); rs->moveNext()) rs->value(size_t{1});
+        for (rs->moveFirst(); !rs->eof(); rs->moveNext())
+            rs->value(size_t{1});
     } catch (const Error&) {
     }
     rs->clearFilter();
