@@ -421,10 +421,6 @@ void compactView(const Table& t, View& v) {
         if (visible(t, v, r)) ids.push_back(r);
     }
     if (newPos == -2) newPos = static_cast<int64_t>(ids.size());
-    if (v.ghost && newPos >= static_cast<int64_t>(ids.size())) {
-        v.ghost = false;  // nothing after it: at EOF
-        newPos = static_cast<int64_t>(ids.size());
-    }
     v.ids.swap(ids);
     v.pos = newPos;
     v.compact = true;
@@ -631,7 +627,7 @@ bool Recordset::eof() const noexcept {
         sync(*table_, *view_);
     } catch (...) {
     }
-    return v.pos >= static_cast<int64_t>(v.ids.size()) || v.ids.empty();
+    return (v.pos >= static_cast<int64_t>(v.ids.size()) && !v.ghost) || v.ids.empty();
 }
 
 void Recordset::finishPendingEdit() {
@@ -664,7 +660,7 @@ void Recordset::moveNext() {
     finishPendingEdit();
     View& v = *view_;
     sync(*table_, v);
-    if (v.pos >= static_cast<int64_t>(v.ids.size()))
+    if (v.pos >= static_cast<int64_t>(v.ids.size()) && !v.ghost)
         raiseRs(rserr::NoCurrentRecord, "MoveNext: the recordset is at EOF");
     if (v.ghost)
         v.ghost = false;
@@ -697,7 +693,7 @@ void Recordset::move(int64_t n, const Variant& start) {
         if (p < 0) raiseRs(rserr::InvalidArgument, "Move: the start bookmark is not valid");
         target = p + n;
     } else {
-        if ((n > 0 && v.pos >= size) || (n < 0 && v.pos < 0))
+        if (!v.ghost && ((n > 0 && v.pos >= size) || (n < 0 && v.pos < 0)))
             raiseRs(rserr::NoCurrentRecord, "Move: the recordset is at BOF or EOF");
         if (v.ghost)
             target = n > 0 ? v.pos + n - 1 : v.pos + n;

@@ -160,8 +160,10 @@ public:
     // --- Editing. ---
     void addNew();
     void update();
+    // Reverts the edit; after a cancelled AddNew the cursor is on the last row.
     void cancelUpdate();
-    // Marks the current row deleted (a new row disappears at once).
+    // Marks the current row deleted (a new row disappears at once). The cursor
+    // stays on the deleted row, whose values cannot be read, until it moves.
     void deleteRecord();
     EditMode editMode() const noexcept;
     RowStatus status() const;

@@ -283,6 +283,15 @@ TEST(RecordsetEditing, CurrentRowDeletedThenCountedStaysInPlace) {
     EXPECT_EQ(rs->recordCount(), 3);
     rs->movePrevious();
     EXPECT_EQ(rs->value("ID").toLong(), 2);
+    // The last row deleted and counted: not yet EOF, MoveNext gets there.
+    rs->moveLast();
+    rs->deleteRecord();
+    EXPECT_EQ(rs->recordCount(), 2);
+    EXPECT_FALSE(rs->eof());
+    rs->moveNext();
+    EXPECT_TRUE(rs->eof());
+    rs->movePrevious();
+    EXPECT_EQ(rs->value("ID").toLong(), 2);
 }
 
 TEST(RecordsetBookmarks, StableAcrossFilterAndSort) {
