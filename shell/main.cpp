@@ -3,10 +3,10 @@
 //   pelta unregister [LIBRARY]  remove them from the registry
 //   pelta create PROGID         create an object by programmatic identifier
 //   pelta smoke                 register, create the entry object, talk to it
+#include <unistd.h>
 #include <filesystem>
 #include <iostream>
 #include <string>
-#include <unistd.h>
 
 #include "platform/automation/error.h"
 #include "platform/automation/registry.h"
@@ -23,7 +23,9 @@ fs::path selfDir() {
 }
 
 // The library sits in ../lib beside the program's bin folder.
-std::string defaultLibrary() { return (selfDir().parent_path() / "lib" / "libPeltaNom15.so").string(); }
+std::string defaultLibrary() {
+    return (selfDir().parent_path() / "lib" / "libPeltaNom15.so").string();
+}
 
 int callEntry(const std::string& lib, const char* symbol) {
     auto fn = reinterpret_cast<pelta::HResult (*)()>(pelta::serverEntryPoint(lib, symbol));
@@ -41,8 +43,9 @@ int smoke(const std::string& lib) {
               << "\n";
     {
         pelta::ObjectRef dispatcher = pelta::createObject("PeltaNom15.cFormDispatcher");
-        std::cout << "created " << dispatcher->typeName() << ", LibName = "
-                  << pelta::getProperty(dispatcher.get(), "LibName").toString() << "\n";
+        std::cout << "created " << dispatcher->typeName()
+                  << ", LibName = " << pelta::getProperty(dispatcher.get(), "LibName").toString()
+                  << "\n";
         pelta::Variant cancel(false);
         pelta::callByName(dispatcher.get(), "QueryTerminate", std::span(&cancel, 1));
         pelta::callByName(dispatcher.get(), "Terminate");

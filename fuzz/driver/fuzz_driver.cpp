@@ -26,7 +26,10 @@ std::vector<uint8_t> mutate(std::vector<uint8_t> d, std::mt19937& rng,
             case 1:
                 if (!d.empty()) d.resize(rng() % d.size());
                 break;
-            case 2: d.insert(d.begin() + (d.empty() ? 0 : rng() % d.size()), static_cast<uint8_t>(rng())); break;
+            case 2:
+                d.insert(d.begin() + (d.empty() ? 0 : rng() % d.size()),
+                         static_cast<uint8_t>(rng()));
+                break;
             case 3:
                 if (!d.empty()) d[rng() % d.size()] = static_cast<uint8_t>(rng());
                 break;
@@ -61,7 +64,8 @@ int main(int argc, char** argv) {
         seeds.emplace_back(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
     }
     if (seeds.empty()) seeds.emplace_back();
-    for (const auto& s : seeds) LLVMFuzzerTestOneInput(s.data(), s.size());
+    for (const auto& s : seeds)
+        LLVMFuzzerTestOneInput(s.data(), s.size());
     long mutations = argc > 2 ? std::atol(argv[2]) : 10000;
     std::mt19937 rng(12345);
     for (long i = 0; i < mutations; ++i) {

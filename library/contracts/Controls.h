@@ -19,13 +19,13 @@ enum class ControlKind {
     Tree,
     TabStrip,
     Splitter,
-    Note,      // multi-line plain text
+    Note,  // multi-line plain text
     RichText,
     Button,
 };
 
 struct ControlDecl {
-    std::string Name;     // "cboBank"
+    std::string Name;  // "cboBank"
     ControlKind Kind = ControlKind::Text;
     std::string Caption;  // "Банка"
     std::string Field;    // bound field of the head, may be empty
@@ -38,13 +38,13 @@ struct ControlDecl {
 enum class EditorKind { None, Text, Number, Date, CheckBox, Combo, Selector };
 
 struct ColumnDecl {
-    std::string Key;      // column key, usually the field name
+    std::string Key;  // column key, usually the field name
     std::string Caption;
-    std::string Field;    // bound field; empty for a computed column
+    std::string Field;  // bound field; empty for a computed column
     bool Visible = true;
     std::string Format;
     EditorKind Editor = EditorKind::None;
-    int32_t Width = 0;    // 0: the host decides
+    int32_t Width = 0;  // 0: the host decides
 };
 
 }  // namespace PeltaNom15

@@ -9,14 +9,18 @@ cFormDispatcher::cFormDispatcher() : m_sLibName("PeltaNom15") {}
 
 cFormDispatcher::~cFormDispatcher() = default;
 
-std::string cFormDispatcher::LibName() { return m_sLibName; }
+std::string cFormDispatcher::LibName() {
+    return m_sLibName;
+}
 
 pelta::ObjectRef cFormDispatcher::GetForm(std::string&) {
     // No screen of the library can be created by name yet.
     return {};
 }
 
-int32_t cFormDispatcher::UnloadAllForms() { return 0; }
+int32_t cFormDispatcher::UnloadAllForms() {
+    return 0;
+}
 
 void cFormDispatcher::QueryTerminate(bool&) {}
 

@@ -22,24 +22,42 @@ void raise(int32_t number, std::string description, std::string source) {
 
 std::string describeError(int32_t number) {
     switch (number) {
-        case errc::InvalidProcedureCall: return "Invalid procedure call or argument";
-        case errc::Overflow: return "Overflow";
-        case errc::OutOfMemory: return "Out of memory";
-        case errc::SubscriptOutOfRange: return "Subscript out of range";
-        case errc::DivisionByZero: return "Division by zero";
-        case errc::TypeMismatch: return "Type mismatch";
-        case errc::BadFileNameOrNumber: return "Bad file name or number";
-        case errc::FileNotFound: return "File not found";
-        case errc::PathNotFound: return "Path not found";
-        case errc::ObjectVariableNotSet: return "Object variable or With block variable not set";
-        case errc::CannotCreateObject: return "ActiveX component can't create object";
-        case errc::ObjectRequired: return "Object required";
-        case errc::NotSupported: return "Object doesn't support this property or method";
-        case errc::WrongArgumentCount: return "Wrong number of arguments or invalid property assignment";
-        case errc::ClassNotRegistered: return "Class not registered";
-        case errc::ClassNotAvailable: return "Class not available";
-        case errc::InvalidData: return "The data is invalid";
-        default: return "Automation error";
+        case errc::InvalidProcedureCall:
+            return "Invalid procedure call or argument";
+        case errc::Overflow:
+            return "Overflow";
+        case errc::OutOfMemory:
+            return "Out of memory";
+        case errc::SubscriptOutOfRange:
+            return "Subscript out of range";
+        case errc::DivisionByZero:
+            return "Division by zero";
+        case errc::TypeMismatch:
+            return "Type mismatch";
+        case errc::BadFileNameOrNumber:
+            return "Bad file name or number";
+        case errc::FileNotFound:
+            return "File not found";
+        case errc::PathNotFound:
+            return "Path not found";
+        case errc::ObjectVariableNotSet:
+            return "Object variable or With block variable not set";
+        case errc::CannotCreateObject:
+            return "ActiveX component can't create object";
+        case errc::ObjectRequired:
+            return "Object required";
+        case errc::NotSupported:
+            return "Object doesn't support this property or method";
+        case errc::WrongArgumentCount:
+            return "Wrong number of arguments or invalid property assignment";
+        case errc::ClassNotRegistered:
+            return "Class not registered";
+        case errc::ClassNotAvailable:
+            return "Class not available";
+        case errc::InvalidData:
+            return "The data is invalid";
+        default:
+            return "Automation error";
     }
 }
 

@@ -40,7 +40,8 @@ Guid Guid::generate() {
     Guid g;
     for (size_t i = 0; i < 16; i += 8) {
         uint64_t r = rng();
-        for (size_t k = 0; k < 8; ++k) g.bytes[i + k] = static_cast<uint8_t>(r >> (8 * k));
+        for (size_t k = 0; k < 8; ++k)
+            g.bytes[i + k] = static_cast<uint8_t>(r >> (8 * k));
     }
     g.bytes[6] = static_cast<uint8_t>((g.bytes[6] & 0x0F) | 0x40);
     g.bytes[8] = static_cast<uint8_t>((g.bytes[8] & 0x3F) | 0x80);
@@ -67,6 +68,8 @@ bool Guid::isNull() const noexcept {
     return true;
 }
 
-std::string newGuidString() { return Guid::generate().toString(); }
+std::string newGuidString() {
+    return Guid::generate().toString();
+}
 
 }  // namespace pelta

@@ -15,11 +15,17 @@ namespace {
 std::atomic<int64_t> g_liveObjects{0};
 }
 
-Object::Object() noexcept { g_liveObjects.fetch_add(1, std::memory_order_relaxed); }
+Object::Object() noexcept {
+    g_liveObjects.fetch_add(1, std::memory_order_relaxed);
+}
 
-Object::~Object() { g_liveObjects.fetch_sub(1, std::memory_order_relaxed); }
+Object::~Object() {
+    g_liveObjects.fetch_sub(1, std::memory_order_relaxed);
+}
 
-int64_t Object::liveObjects() noexcept { return g_liveObjects.load(std::memory_order_relaxed); }
+int64_t Object::liveObjects() noexcept {
+    return g_liveObjects.load(std::memory_order_relaxed);
+}
 
 Variant Object::invoke(std::string_view member, CallKind, std::span<Variant>) {
     raise(errc::NotSupported, {}, typeName() + "." + std::string(member));

@@ -53,14 +53,18 @@ class Ref {
 public:
     Ref() noexcept = default;
     Ref(std::nullptr_t) noexcept {}
-    Ref(T* p) noexcept : p_(p) { if (p_) obj(p_)->addRef(); }
+    Ref(T* p) noexcept : p_(p) {
+        if (p_) obj(p_)->addRef();
+    }
     Ref(const Ref& o) noexcept : Ref(o.p_) {}
     Ref(Ref&& o) noexcept : p_(std::exchange(o.p_, nullptr)) {}
     template <class U>
     Ref(const Ref<U>& o) noexcept : Ref(static_cast<T*>(o.get())) {}
     template <class U>
     Ref(Ref<U>&& o) noexcept : p_(static_cast<T*>(o.detach())) {}
-    ~Ref() { if (p_) obj(p_)->release(); }
+    ~Ref() {
+        if (p_) obj(p_)->release();
+    }
 
     Ref& operator=(Ref o) noexcept {
         std::swap(p_, o.p_);

@@ -55,8 +55,10 @@ std::vector<ClassEntry> parseRegistry(std::istream& in) {
         if (eq == std::string::npos) continue;
         std::string key = lowerAscii(trim(t.substr(0, eq)));
         std::string value = trim(t.substr(eq + 1));
-        if (key == "progid") cur->progId = value;
-        else if (key == "inprocserver") cur->path = value;
+        if (key == "progid")
+            cur->progId = value;
+        else if (key == "inprocserver")
+            cur->path = value;
     }
     flush();
     return out;
@@ -65,7 +67,8 @@ std::vector<ClassEntry> parseRegistry(std::istream& in) {
 // Holds an exclusive lock on a companion lock file while the registry changes.
 class FileLock {
 public:
-    explicit FileLock(const fs::path& p) : fd_(::open(p.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0644)) {
+    explicit FileLock(const fs::path& p)
+        : fd_(::open(p.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0644)) {
         if (fd_ >= 0) ::flock(fd_, LOCK_EX);
     }
     ~FileLock() {
@@ -140,7 +143,8 @@ void ClassRegistry::rewrite(const std::function<void(std::vector<ClassEntry>&)>&
         for (auto& e : list)
             out << "\n[" << e.clsid.toString() << "]\nProgID=" << e.progId
                 << "\nInprocServer=" << e.path << "\n";
-        if (!out.flush()) raise(errc::PathNotFound, "Cannot write the class registry " + tmp.string());
+        if (!out.flush())
+            raise(errc::PathNotFound, "Cannot write the class registry " + tmp.string());
     }
     fs::rename(tmp, file_, ec);
     if (ec) raise(errc::PathNotFound, "Cannot replace the class registry " + file_.string());
@@ -186,7 +190,8 @@ void* serverEntryPoint(const std::string& path, const char* symbol) {
             handle = ::dlopen(path.c_str(), RTLD_NOW | RTLD_GLOBAL);
             if (!handle) {
                 const char* why = ::dlerror();
-                cannotCreate("cannot load library " + path + (why ? std::string(" (") + why + ")" : ""));
+                cannotCreate("cannot load library " + path +
+                             (why ? std::string(" (") + why + ")" : ""));
             }
             libs.emplace(path, handle);
         }
@@ -280,7 +285,8 @@ HResult InprocServer::registerServer() const noexcept {
 HResult InprocServer::unregisterServer() const noexcept {
     try {
         std::vector<Guid> ids;
-        for (auto& e : classEntries()) ids.push_back(e.clsid);
+        for (auto& e : classEntries())
+            ids.push_back(e.clsid);
         ClassRegistry().remove(ids);
         return kOk;
     } catch (...) {

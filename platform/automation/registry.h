@@ -88,8 +88,8 @@ void* serverEntryPoint(const std::string& path, const char* symbol);
 
 // The server side, for libraries implementing the entry points.
 struct ServerClass {
-    const char* clsid;  // braced
-    const char* name;   // object name; the programmatic identifier is Library.name
+    const char* clsid;      // braced
+    const char* name;       // object name; the programmatic identifier is Library.name
     ObjectRef (*create)();  // null while the class is not available
 };
 

@@ -37,24 +37,48 @@ Variant& Variant::operator=(Variant&& o) noexcept {
 
 void Variant::copyFrom(const Variant& o) {
     switch (o.type_) {
-        case VarType::Decimal: new (&u_.dec) Decimal(o.u_.dec); break;
-        case VarType::String: new (&u_.s) std::string(o.u_.s); break;
-        case VarType::Object: new (&u_.o) ObjectRef(o.u_.o); break;
-        case VarType::Array: new (&u_.arr) std::vector<Variant>(o.u_.arr); break;
-        case VarType::Bytes: new (&u_.bytes) Bytes(o.u_.bytes); break;
-        default: u_.i64 = o.u_.i64; break;
+        case VarType::Decimal:
+            new (&u_.dec) Decimal(o.u_.dec);
+            break;
+        case VarType::String:
+            new (&u_.s) std::string(o.u_.s);
+            break;
+        case VarType::Object:
+            new (&u_.o) ObjectRef(o.u_.o);
+            break;
+        case VarType::Array:
+            new (&u_.arr) std::vector<Variant>(o.u_.arr);
+            break;
+        case VarType::Bytes:
+            new (&u_.bytes) Bytes(o.u_.bytes);
+            break;
+        default:
+            u_.i64 = o.u_.i64;
+            break;
     }
     type_ = o.type_;
 }
 
 void Variant::moveFrom(Variant& o) noexcept {
     switch (o.type_) {
-        case VarType::Decimal: new (&u_.dec) Decimal(o.u_.dec); break;
-        case VarType::String: new (&u_.s) std::string(std::move(o.u_.s)); break;
-        case VarType::Object: new (&u_.o) ObjectRef(std::move(o.u_.o)); break;
-        case VarType::Array: new (&u_.arr) std::vector<Variant>(std::move(o.u_.arr)); break;
-        case VarType::Bytes: new (&u_.bytes) Bytes(std::move(o.u_.bytes)); break;
-        default: u_.i64 = o.u_.i64; break;
+        case VarType::Decimal:
+            new (&u_.dec) Decimal(o.u_.dec);
+            break;
+        case VarType::String:
+            new (&u_.s) std::string(std::move(o.u_.s));
+            break;
+        case VarType::Object:
+            new (&u_.o) ObjectRef(std::move(o.u_.o));
+            break;
+        case VarType::Array:
+            new (&u_.arr) std::vector<Variant>(std::move(o.u_.arr));
+            break;
+        case VarType::Bytes:
+            new (&u_.bytes) Bytes(std::move(o.u_.bytes));
+            break;
+        default:
+            u_.i64 = o.u_.i64;
+            break;
     }
     type_ = o.type_;
     o.clear();
@@ -62,12 +86,23 @@ void Variant::moveFrom(Variant& o) noexcept {
 
 void Variant::clear() noexcept {
     switch (type_) {
-        case VarType::Decimal: u_.dec.~Decimal(); break;
-        case VarType::String: u_.s.~basic_string(); break;
-        case VarType::Object: u_.o.~Ref(); break;
-        case VarType::Array: u_.arr.~vector(); break;
-        case VarType::Bytes: u_.bytes.~vector(); break;
-        default: break;
+        case VarType::Decimal:
+            u_.dec.~Decimal();
+            break;
+        case VarType::String:
+            u_.s.~basic_string();
+            break;
+        case VarType::Object:
+            u_.o.~Ref();
+            break;
+        case VarType::Array:
+            u_.arr.~vector();
+            break;
+        case VarType::Bytes:
+            u_.bytes.~vector();
+            break;
+        default:
+            break;
     }
     type_ = VarType::Empty;
     u_.i64 = 0;
@@ -111,8 +146,10 @@ bool Variant::isNumber() const noexcept {
         case VarType::Long:
         case VarType::Double:
         case VarType::Currency:
-        case VarType::Decimal: return true;
-        default: return false;
+        case VarType::Decimal:
+            return true;
+        default:
+            return false;
     }
 }
 
@@ -151,43 +188,70 @@ bool operator==(const Variant& a, const Variant& b) {
     switch (a.type_) {
         case VarType::Empty:
         case VarType::Null:
-        case VarType::Missing: return true;
-        case VarType::Boolean: return a.u_.b == b.u_.b;
-        case VarType::Byte: return a.u_.by == b.u_.by;
-        case VarType::Integer: return a.u_.i16 == b.u_.i16;
+        case VarType::Missing:
+            return true;
+        case VarType::Boolean:
+            return a.u_.b == b.u_.b;
+        case VarType::Byte:
+            return a.u_.by == b.u_.by;
+        case VarType::Integer:
+            return a.u_.i16 == b.u_.i16;
         case VarType::Long:
-        case VarType::Error: return a.u_.i32 == b.u_.i32;
+        case VarType::Error:
+            return a.u_.i32 == b.u_.i32;
         case VarType::Double:
-        case VarType::Date: return a.u_.d == b.u_.d;
-        case VarType::Currency: return a.u_.i64 == b.u_.i64;
+        case VarType::Date:
+            return a.u_.d == b.u_.d;
+        case VarType::Currency:
+            return a.u_.i64 == b.u_.i64;
         case VarType::Decimal:
             return a.u_.dec == b.u_.dec && a.u_.dec.scale() == b.u_.dec.scale();
-        case VarType::String: return a.u_.s == b.u_.s;
-        case VarType::Object: return a.u_.o == b.u_.o;
-        case VarType::Array: return a.u_.arr == b.u_.arr;
-        case VarType::Bytes: return a.u_.bytes == b.u_.bytes;
+        case VarType::String:
+            return a.u_.s == b.u_.s;
+        case VarType::Object:
+            return a.u_.o == b.u_.o;
+        case VarType::Array:
+            return a.u_.arr == b.u_.arr;
+        case VarType::Bytes:
+            return a.u_.bytes == b.u_.bytes;
     }
     return false;
 }
 
 std::string typeName(const Variant& v) {
     switch (v.type()) {
-        case VarType::Empty: return "Empty";
-        case VarType::Null: return "Null";
-        case VarType::Missing: return "Error";
-        case VarType::Boolean: return "Boolean";
-        case VarType::Byte: return "Byte";
-        case VarType::Integer: return "Integer";
-        case VarType::Long: return "Long";
-        case VarType::Double: return "Double";
-        case VarType::Currency: return "Currency";
-        case VarType::Decimal: return "Decimal";
-        case VarType::Date: return "Date";
-        case VarType::String: return "String";
-        case VarType::Object: return v.object() ? v.object()->typeName() : "Nothing";
-        case VarType::Error: return "Error";
-        case VarType::Array: return "Variant()";
-        case VarType::Bytes: return "Byte()";
+        case VarType::Empty:
+            return "Empty";
+        case VarType::Null:
+            return "Null";
+        case VarType::Missing:
+            return "Error";
+        case VarType::Boolean:
+            return "Boolean";
+        case VarType::Byte:
+            return "Byte";
+        case VarType::Integer:
+            return "Integer";
+        case VarType::Long:
+            return "Long";
+        case VarType::Double:
+            return "Double";
+        case VarType::Currency:
+            return "Currency";
+        case VarType::Decimal:
+            return "Decimal";
+        case VarType::Date:
+            return "Date";
+        case VarType::String:
+            return "String";
+        case VarType::Object:
+            return v.object() ? v.object()->typeName() : "Nothing";
+        case VarType::Error:
+            return "Error";
+        case VarType::Array:
+            return "Variant()";
+        case VarType::Bytes:
+            return "Byte()";
     }
     return "Unknown";
 }

@@ -27,7 +27,8 @@ void ByteWriter::str(std::string_view s) {
 
 void ByteReader::fail(std::string_view what) const {
     raise(errc::InvalidData,
-          "Malformed data at byte " + std::to_string(pos_) + ": " + std::string(what), "ByteReader");
+          "Malformed data at byte " + std::to_string(pos_) + ": " + std::string(what),
+          "ByteReader");
 }
 
 std::span<const uint8_t> ByteReader::take(size_t n) {
@@ -37,12 +38,24 @@ std::span<const uint8_t> ByteReader::take(size_t n) {
     return s;
 }
 
-uint8_t ByteReader::u8() { return take(1)[0]; }
-uint32_t ByteReader::u32() { return fixed<uint32_t>(); }
-uint64_t ByteReader::u64() { return fixed<uint64_t>(); }
-int32_t ByteReader::i32() { return fixed<int32_t>(); }
-int64_t ByteReader::i64() { return fixed<int64_t>(); }
-double ByteReader::f64() { return fixed<double>(); }
+uint8_t ByteReader::u8() {
+    return take(1)[0];
+}
+uint32_t ByteReader::u32() {
+    return fixed<uint32_t>();
+}
+uint64_t ByteReader::u64() {
+    return fixed<uint64_t>();
+}
+int32_t ByteReader::i32() {
+    return fixed<int32_t>();
+}
+int64_t ByteReader::i64() {
+    return fixed<int64_t>();
+}
+double ByteReader::f64() {
+    return fixed<double>();
+}
 
 uint64_t ByteReader::varint() {
     uint64_t v = 0;
@@ -62,7 +75,9 @@ size_t ByteReader::length(size_t minElementSize) {
     return static_cast<size_t>(n);
 }
 
-std::span<const uint8_t> ByteReader::blob() { return take(length()); }
+std::span<const uint8_t> ByteReader::blob() {
+    return take(length());
+}
 
 std::string_view ByteReader::str() {
     auto b = blob();

@@ -36,7 +36,8 @@ protected:
         std::string out;
         FILE* p = ::popen(cmd.c_str(), "r");
         char buf[512];
-        while (p && std::fgets(buf, sizeof buf, p)) out += buf;
+        while (p && std::fgets(buf, sizeof buf, p))
+            out += buf;
         status = p ? ::pclose(p) : -1;
         return out;
     }

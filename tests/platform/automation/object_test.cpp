@@ -27,8 +27,7 @@ public:
             args[0].swap(args[1]);
             return true;
         }
-        if (pelta::memberIs(member, "Greet") && args.size() == 1)
-            return greet(args[0].toString());
+        if (pelta::memberIs(member, "Greet") && args.size() == 1) return greet(args[0].toString());
         return Object::invoke(member, kind, args);
     }
 
@@ -72,8 +71,7 @@ TEST(Object, LateBoundCallsWriteBackByReferenceArguments) {
     EXPECT_EQ(args[1], pelta::Variant("a"));
 
     pelta::Variant who("Мария");
-    EXPECT_EQ(pelta::callByName(o.get(), "greet", std::span(&who, 1)).toString(),
-              "Здравей, Мария");
+    EXPECT_EQ(pelta::callByName(o.get(), "greet", std::span(&who, 1)).toString(), "Здравей, Мария");
 
     try {
         pelta::callByName(o.get(), "NoSuchMember");
