@@ -22,25 +22,25 @@ constexpr int kBanks = 10;
 constexpr int kDays = 100000;  // 10 banks x 100,000 days = 1,000,000 rate records
 constexpr int64_t kRows = int64_t{kBanks} * kDays;
 
-// The database is built once per process.
+// The database is built once per process and removed at exit (the path is
+// never destroyed, so the exit handler may still read it).
 const std::string& databasePath() {
-    static const std::string path = [] {
-        std::string p = (std::filesystem::temp_directory_path() /
-                         ("pelta_bll_bench_" + std::to_string(::getpid()) + ".db"))
-                            .string();
+    static const std::string* path = [] {
+        auto* p = new std::string((std::filesystem::temp_directory_path() /
+                                   ("pelta_bll_bench_" + std::to_string(::getpid()) + ".db"))
+                                      .string());
         pelta::bll::DemoOptions o;
         o.banks = kBanks;
         o.rateDays = kDays;
         o.currenciesPerRate = 1;
-        pelta::bll::createDemoDatabase(p, o);
+        pelta::bll::createDemoDatabase(*p, o);
         std::atexit([] {
-            std::filesystem::remove(databasePath());
-            std::filesystem::remove(databasePath() + "-wal");
-            std::filesystem::remove(databasePath() + "-shm");
+            for (const char* suffix : {"", "-wal", "-shm"})
+                std::filesystem::remove(databasePath() + suffix);
         });
         return p;
     }();
-    return path;
+    return *path;
 }
 
 double g_serviceSeconds = 0, g_bareSeconds = 0;
