@@ -1,0 +1,187 @@
+// The schema, created and upgraded by numbered migrations. Each migration runs
+// in one transaction together with its row in sys_migrations, so a database is
+// always at a whole version. Migrations are only ever appended.
+#include <span>
+
+#include "bll/database.h"
+#include "bll/service.h"
+
+namespace pelta::bll {
+
+namespace {
+
+struct Migration {
+    int version;
+    const char* name;
+    const char* sql;
+};
+
+// The administrators' group and user that every database starts with.
+constexpr const char* kMigration1 = R"sql(
+CREATE TABLE sys_settings (
+    Name VARCHAR(100) NOT NULL PRIMARY KEY,
+    Kind VARCHAR(20) NOT NULL DEFAULT 'String'
+        CHECK (Kind IN ('String', 'Long', 'Boolean', 'Decimal', 'Date', 'Guid')),
+    Value TEXT
+);
+
+CREATE TABLE sec_users (
+    ID GUID NOT NULL PRIMARY KEY,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    FullName VARCHAR(200),
+    IsActive BOOLEAN NOT NULL DEFAULT 1
+);
+
+CREATE TABLE sec_groups (
+    ID GUID NOT NULL PRIMARY KEY,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    IsAdmin BOOLEAN NOT NULL DEFAULT 0
+);
+
+CREATE TABLE sec_usergroups (
+    User_ID GUID NOT NULL REFERENCES sec_users (ID) ON DELETE CASCADE,
+    Group_ID GUID NOT NULL REFERENCES sec_groups (ID),
+    PRIMARY KEY (User_ID, Group_ID)
+);
+CREATE INDEX ix_sec_usergroups_group ON sec_usergroups (Group_ID);
+
+CREATE TABLE sec_grouprights (
+    Group_ID GUID NOT NULL REFERENCES sec_groups (ID) ON DELETE CASCADE,
+    Screen VARCHAR(100) NOT NULL,
+    Rights INTEGER NOT NULL DEFAULT 0,
+    PRIMARY KEY (Group_ID, Screen)
+);
+
+INSERT INTO sec_groups (ID, Name, IsAdmin)
+    VALUES ('{6A1F0C2E-5B7D-4E21-9C3A-0F4B8D2E7A11}', 'Administrators', 1);
+INSERT INTO sec_users (ID, Name, FullName, IsActive)
+    VALUES ('{0B9E3D5A-1C2F-4A6B-8D7E-3F5A9C1B2E40}', 'admin', 'Administrator', 1);
+INSERT INTO sec_usergroups (User_ID, Group_ID)
+    VALUES ('{0B9E3D5A-1C2F-4A6B-8D7E-3F5A9C1B2E40}', '{6A1F0C2E-5B7D-4E21-9C3A-0F4B8D2E7A11}');
+
+INSERT INTO sys_settings (Name, Kind, Value) VALUES
+    ('DefCurrency_ID', 'Guid', NULL),
+    ('DefPriceList_ID', 'Guid', NULL),
+    ('DefVatPriceScale', 'Long', '2'),
+    ('DefCgDimension_ID', 'Guid', NULL),
+    ('DefItmDimensionName', 'String', ''),
+    ('DefCgDimensionName', 'String', '');
+)sql";
+
+// Currencies, the banks that publish rates, and the rates: a head per bank
+// and date, a row per currency. A rate row repeats its head's bank and date
+// so that one currency has one rate per bank and date across all records.
+constexpr const char* kMigration2 = R"sql(
+CREATE TABLE nom_currencies (
+    ID GUID NOT NULL PRIMARY KEY,
+    Code VARCHAR(10) NOT NULL UNIQUE,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    Note VARCHAR(255),
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+
+CREATE TABLE nom_banks (
+    ID GUID NOT NULL PRIMARY KEY,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    Description VARCHAR(255),
+    GroupName VARCHAR(100),
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+
+CREATE TABLE nom_currratios (
+    ID GUID NOT NULL PRIMARY KEY,
+    Date DATE NOT NULL,
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    Pr_ID GUID NOT NULL REFERENCES nom_banks (ID),
+    Note VARCHAR(255),
+    NoteRtf LONGTEXT,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+CREATE INDEX ix_nom_currratios_bank ON nom_currratios (Pr_ID, Date);
+CREATE INDEX ix_nom_currratios_date ON nom_currratios (Date);
+
+CREATE TABLE nom_currratiosdetails (
+    ID GUID NOT NULL PRIMARY KEY,
+    CurrRatio_ID GUID NOT NULL REFERENCES nom_currratios (ID) ON DELETE CASCADE,
+    Currency_ID GUID NOT NULL REFERENCES nom_currencies (ID),
+    Pr_ID GUID NOT NULL REFERENCES nom_banks (ID),
+    Date DATE NOT NULL,
+    Units INTEGER NOT NULL DEFAULT 1 CHECK (Units > 0),
+    Rate DECIMAL(18,6) NOT NULL CHECK (Rate > 0),
+    UNIQUE (Pr_ID, Date, Currency_ID)
+);
+CREATE INDEX ix_nom_currratiosdetails_head ON nom_currratiosdetails (CurrRatio_ID);
+CREATE INDEX ix_nom_currratiosdetails_currency ON nom_currratiosdetails (Currency_ID);
+)sql";
+
+constexpr Migration kMigrations[] = {
+    {1, "users, groups, rights and settings", kMigration1},
+    {2, "currencies, banks and currency rates", kMigration2},
+};
+
+int currentVersion(Database& db) {
+    auto st = db.prepare(
+        "SELECT COUNT(*) FROM sqlite_schema WHERE type = 'table' AND name = 'sys_migrations'");
+    st->step();
+    if (st->int64(0) == 0) return 0;
+    auto v = db.prepare("SELECT COALESCE(MAX(Version), 0) FROM sys_migrations");
+    v->step();
+    return static_cast<int>(v->int64(0));
+}
+
+}  // namespace
+
+int schemaVersion() {
+    return std::span(kMigrations).back().version;
+}
+
+static void migrate(Database& db) {
+    db.begin(true);
+    try {
+        db.execute(
+            "CREATE TABLE IF NOT EXISTS sys_migrations (Version INTEGER NOT NULL PRIMARY KEY, "
+            "Name VARCHAR(200) NOT NULL, AppliedOn DATETIME NOT NULL)");
+        db.commit();
+    } catch (...) {
+        db.rollback();
+        throw;
+    }
+    for (const Migration& m : kMigrations) {
+        Transaction tx(db, true);
+        // Checked inside the write lock: another process may have applied it.
+        int have = currentVersion(db);
+        if (have > schemaVersion())
+            raise(errc::Fail,
+                  "The database is of schema version " + std::to_string(have) +
+                      ", newer than this program knows (" + std::to_string(schemaVersion()) + ")",
+                  "Database");
+        if (m.version <= have) continue;
+        db.execute(m.sql);
+        auto st =
+            db.prepare("INSERT INTO sys_migrations (Version, Name, AppliedOn) VALUES (?1, ?2, ?3)");
+        st->bind(1, Variant(m.version));
+        st->bind(2, Variant(m.name));
+        st->bind(3, Variant(now()));
+        st->step();
+        tx.commit();
+    }
+}
+
+std::unique_ptr<Database> openDatabase(const std::string& path) {
+    auto db = openSqlite(path);
+    migrate(*db);
+    return db;
+}
+
+}  // namespace pelta::bll
