@@ -31,7 +31,8 @@ struct ControlDecl {
     std::string Field;    // bound field of the head, may be empty
     std::string Group;    // group or tab the control sits in
     std::string Format;   // number or date format
-    std::string Hint;     // prompt shown in an empty field
+    std::string Prompt;   // shown in an empty field ("Изберете банка")
+    std::string Hint;     // shown beside the field
     bool ReadOnly = false;
 };
 

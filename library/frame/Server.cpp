@@ -2,6 +2,7 @@
 // class identifiers, and the four exported entry points.
 #include "library/frame/LibObject.h"
 #include "library/frame/cFormDispatcher.h"
+#include "library/other/ctxRatios.h"
 #include "platform/automation/registry.h"
 
 namespace PeltaNom15 {
@@ -25,7 +26,7 @@ const pelta::InprocServer& server() {
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0004}", "ctxDocTypes", nullptr},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0005}", "ctxAccAccounts", nullptr},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0006}", "ctxContragents", nullptr},
-            {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0007}", "ctxRatios", nullptr},
+            {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0007}", "ctxRatios", &create<ctxRatios>},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0008}", "ctxPriceLists", nullptr},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0009}", "ctxDimensions", nullptr},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D000A}", "ctxDiscounts", nullptr},

@@ -1,0 +1,113 @@
+// The frame every detail form follows: it edits one record — a head and
+// usually row lists — inside the framework's document window. The framework
+// decides when to fetch, fill, check, upload and save; the frame answers
+// those events, and a form overrides the hooks for what makes it different.
+//
+// Head fields are bound to the declared controls through ControlDecl::Field:
+// the frame fills them, compares them for IsModified and uploads them.
+#pragma once
+
+#include <cstdint>
+#include <functional>
+#include <string>
+#include <vector>
+
+#include "library/contracts/Controls.h"
+#include "library/contracts/Extenders.h"
+#include "library/contracts/IZonTerminate.h"
+#include "library/frame/Forms.h"
+#include "library/frame/IDetailForm.h"
+
+namespace PeltaNom15 {
+
+struct DetailDefinition {
+    std::string Caption;     // "Валутни курсове", also the list's caption in messages
+    std::string ObjectName;  // "frmRatiosDetails"
+    int32_t HelpID = 0;
+    std::string LayoutKey;
+    std::string ListName;  // "ctxRatios": refreshed after a save, and whose rights apply
+    std::string ReadOperation;
+    std::string UpdateOperation;
+    std::string DeleteOperation;
+    std::string KeyField = "ID";
+    std::vector<ControlDecl> Controls;
+    // Head fields whose control IsModified compares; empty: every bound field.
+    std::vector<std::string> ModifiedFields;
+};
+
+class cDetailFrame : public LibForm, public IDetailForm, public IZonTerminate {
+public:
+    // IDetailForm
+    bool frInit(IClientSite* Site) override;
+    bool ShowDetails(const std::string& Key) override;
+    void SetOpener(std::function<void(RecordsetRef)> RowSaved,
+                   std::function<void()> RecordDeleted) override;
+    IFormExtender* FormExtender() override { return m_oForm.get(); }
+
+    // IZonTerminate: refuses while the shown record has unsaved edits.
+    void QueryTerminate(bool& Cancel) override;
+    void Terminate() override;
+
+    const std::string& Key() const noexcept { return m_sKey; }
+    RecordsetRef Head() const;
+
+protected:
+    explicit cDetailFrame(DetailDefinition Def);
+    ~cDetailFrame() override;
+
+    // ---- what a form adds ----
+    // Grids, drop-downs, tabs and splitters; False when the form cannot work.
+    virtual bool pvInitForm() { return true; }
+    // Takes the row lists and reference lists of a successful fetch or save.
+    virtual void pvTakeResponse(pelta::PropertyBag& Response, bool Fetched) {}
+    // Defaults of a new record beyond ID, IsActive, CU and CD (the head row
+    // is being added).
+    virtual void pvNewRecord() {}
+    virtual void pvFillControls() {}
+    virtual bool pvIsModified() { return false; }
+    // Checks beyond the frame's; False (after telling the user) refuses.
+    virtual bool pvIsCorrect() { return true; }
+    // Copies what the bound controls do not cover into the head and rows.
+    virtual void pvUpload() {}
+    // Request properties of the save beyond "Head", "NeedFetch", "NeedList".
+    virtual void pvWriteSaveRequest(pelta::PropertyBag& Request) {}
+    // A refused save that names a row: positions on it and tells the user.
+    // False when the form has no row of that kind (the frame then shows the
+    // refusal itself).
+    virtual bool pvShowRowError(pelta::PropertyBag& Response, const std::string& RowID) {
+        return false;
+    }
+
+    // ---- shared ----
+    bool pvHasRight(int32_t RightFlag);
+    // The value of a control as a head field takes it: Null for an empty one.
+    pelta::Variant pvControlField(const std::string& ControlName);
+    // Equality as an edit sees it: empty and Null alike, texts by content.
+    static bool SameValue(const pelta::Variant& A, const pelta::Variant& B);
+
+    DetailDefinition m_oDef;
+    pelta::Ref<IClientSite> m_oSite;
+    pelta::Ref<IBllConnection> m_oConnection;
+    pelta::Ref<IFormExtender> m_oForm;
+    pelta::Ref<IDetailOpener> m_oDetailOpener;
+    std::string m_sKey;
+    RecordsetRef m_rsHead;
+    int32_t m_lInstanceID = 0;
+
+private:
+    void m_oForm_Fetch(int32_t Step, bool& Cancel);
+    void m_oForm_FillControls();
+    void m_oForm_IsModified(bool& Modified);
+    void m_oForm_IsCorrect(bool& Cancel);
+    void m_oForm_Upload();
+    void m_oForm_Save(bool& Cancel);
+    void m_oForm_QueryStandalone(bool& Cancel);
+    void m_oForm_BeforeExecute(int32_t CommandID, bool& Handled);
+    void pvDelete();
+    bool pvModified();
+
+    std::function<void(RecordsetRef)> m_fnRowSaved;
+    std::function<void()> m_fnRecordDeleted;
+};
+
+}  // namespace PeltaNom15
