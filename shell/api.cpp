@@ -427,7 +427,13 @@ ApiResponse Api::route(const ApiRequest& r) {
                                   [&](const ControlInfo& ci) { return ci.name == control; });
             if (c == controls.end()) throw ApiError(400, "Unknown control");
             if (c->readOnly) throw ApiError(400, "The control is read-only");
-            screen->setValue(control, fromJson(value, c->kind));
+            Variant typed;
+            try {
+                typed = fromJson(value, c->kind);
+            } catch (const pelta::Error& e) {
+                throw ApiError(400, e.description());
+            }
+            screen->setValue(control, typed);
             return json{{"ok", true}};
         }));
     }

@@ -131,7 +131,7 @@ struct HttpServer::Impl {
         server.new_task_queue = [n = options.threads] { return new httplib::ThreadPool(n); };
         server.set_payload_max_length(options.maxBody);
         server.set_keep_alive_timeout(5);
-        server.set_read_timeout(10);
+        server.set_read_timeout(static_cast<time_t>(options.readTimeout.count()));
         server.set_write_timeout(10);
         server.set_default_headers({{"X-Content-Type-Options", "nosniff"},
                                     {"Referrer-Policy", "no-referrer"},

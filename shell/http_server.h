@@ -19,6 +19,8 @@ struct HttpOptions {
     std::chrono::milliseconds heartbeat{std::chrono::seconds(10)};
     size_t threads = 64;  // each open event stream holds one
     size_t maxBody = 1 << 20;
+    // How long a client may take to send a request.
+    std::chrono::seconds readTimeout{10};
 };
 
 class HttpServer {
