@@ -20,8 +20,6 @@ namespace {
 
 __extension__ typedef unsigned __int128 u128;
 
-constexpr u128 kMax96 = (static_cast<u128>(1) << 96) - 1;
-
 u128 pow10(int n) noexcept {
     u128 r = 1;
     for (int i = 0; i < n; ++i)

@@ -34,13 +34,15 @@ public:
     bool isZero() const noexcept { return lo_ == 0 && hi_ == 0; }
 
     double toDouble() const noexcept;
-    // Raises Overflow (6) when out of range of int64.
+    // Rounded half to even, as the language's integer conversions; raises
+    // Overflow (6) when out of range of int64.
     int64_t toInt64() const;
     // Plain text without exponent and without trailing zeros beyond the
     // scale's significance ("1.5", "-0.001", "12").
     std::string toString() const;
 
-    // Rounded half away from zero to `places` decimal places (0 to 28).
+    // Rounded half away from zero to `places` decimal places (0 to 28; others
+    // raise InvalidProcedureCall, 5).
     Decimal round(int places) const;
     Decimal truncate() const;  // towards zero
     Decimal abs() const noexcept;

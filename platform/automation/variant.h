@@ -158,11 +158,15 @@ std::string typeName(const Variant& v);
 
 // Comparison as the language's relational operators do it for two non-Null
 // values: numbers numerically, texts by code point (or without regard to case
-// when `ignoreCase`), a number against numeric text numerically. Raises
-// TypeMismatch for values that cannot be compared. Returns <0, 0, >0.
+// when `ignoreCase`), a number against numeric text numerically (a date
+// against date text as dates), any other text after every number; Empty is 0
+// or "". Raises TypeMismatch for values that cannot be compared (objects,
+// arrays, errors) and InvalidUseOfNull for Null. Returns <0, 0, >0.
 int compareValues(const Variant& a, const Variant& b, bool ignoreCase = false);
 
-// Date parts.
+// Date parts. Parts out of their range roll over as DateSerial does (month 13
+// is January of the next year, day 0 the last day of the month before); a
+// result outside 0100-01-01..9999-12-31 raises Overflow (6).
 Date makeDate(int year, int month, int day, int hour = 0, int minute = 0, int second = 0,
               int millisecond = 0);
 struct DateParts {
@@ -172,10 +176,14 @@ struct DateParts {
 DateParts splitDate(Date d);
 // Now, in local time.
 Date now();
-// Parses a date text as CDate does; nullopt when it is not a date.
+// Parses a date text: "dd.mm.yyyy[ hh:nn[:ss]]" (also d.m.yy, and the year
+// mark "г."), ISO "yyyy-mm-dd[Thh:nn:ss[.fff]]" and a time "hh:nn[:ss]" (on
+// day 0). False when the text is not a valid date.
 bool parseDate(std::string_view text, Date& out) noexcept;
 // Formats with a pattern of the Format function: yyyy, yy, mm, m, dd, d, hh, h,
-// nn, ss, and literal text (e.g. "yyyy.mm.dd hh:nn:ss", "yyyy_mm_dd").
+// nn, n, ss, s ("mm" is always the month, "nn" the minutes), text in double
+// quotes or after "\" literally, any other character as it is (e.g.
+// "yyyy.mm.dd hh:nn:ss", "yyyy_mm_dd"). Seconds are rounded.
 std::string formatDate(Date d, std::string_view pattern);
 
 }  // namespace pelta
