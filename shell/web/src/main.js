@@ -177,9 +177,10 @@ function activate(id) {
 
 const loading = new Map(); // id -> promise of showScreen, so that a screen is drawn once at a time
 
-function showScreen(id) {
+// Draws a screen anew; `bringForward` for a screen opened (not one that only changed).
+function showScreen(id, bringForward = true) {
   const prior = loading.get(id) ?? Promise.resolve();
-  const next = prior.then(() => drawScreen(id));
+  const next = prior.then(() => drawScreen(id, bringForward));
   loading.set(id, next);
   next.finally(() => {
     if (loading.get(id) === next) loading.delete(id);
@@ -187,7 +188,7 @@ function showScreen(id) {
   return next;
 }
 
-async function drawScreen(id) {
+async function drawScreen(id, bringForward) {
   let description;
   try {
     description = await connection.get(`/api/screens/${id}`);
@@ -213,9 +214,12 @@ async function drawScreen(id) {
     screen = { description, tab, view, grids: [] };
     screens.set(id, screen);
   }
+  const isNew = !screen.drawn;
   screen.description = description;
   render(screen);
-  activate(id);
+  screen.drawn = true;
+  if (bringForward || isNew) activate(id);
+  else screen.view.hidden = active !== id;
 }
 
 function removeScreen(id) {
@@ -276,7 +280,7 @@ function listen() {
     screen: (e) => {
       if (e.change === 'closed') removeScreen(e.screen);
       else if (e.change === 'opened' && (screens.has(e.screen) || loading.has(e.screen))) activate(e.screen);
-      else showScreen(e.screen);
+      else showScreen(e.screen, e.change === 'opened');
     },
     refresh: (e) => {
       const s = screens.get(e.screen);
