@@ -7,11 +7,19 @@ packages=(
   g++ cmake ninja-build ccache pkg-config git
   libicu-dev libsqlite3-dev libunwind-dev
   libgtest-dev libgmock-dev libbenchmark-dev
+  libcpp-httplib-dev nlohmann-json3-dev
 )
-# Extra groups: "fuzz" adds clang with its sanitizer runtimes.
+# Extra groups: "fuzz" adds clang with its sanitizer runtimes; "browser" adds
+# Node.js with npm (for the shell's front end and its browser test) and the
+# Chromium that the browser test drives headless.
 for extra in "$@"; do
   case "$extra" in
     fuzz) packages+=(clang libclang-rt-14-dev) ;;
+    browser)
+      packages+=(chromium)
+      # The machine's Node.js when it has one; Debian's otherwise.
+      command -v npm >/dev/null || packages+=(nodejs npm)
+      ;;
   esac
 done
 

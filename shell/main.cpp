@@ -1,16 +1,20 @@
 // pelta: the host program of the library.
+//   pelta [serve [OPTIONS]]     serve the library's screens to a web browser
 //   pelta register [LIBRARY]    register the library's public objects
 //   pelta unregister [LIBRARY]  remove them from the registry
 //   pelta create PROGID         create an object by programmatic identifier
 //   pelta smoke                 register, create the entry object, talk to it
 #include <unistd.h>
+#include <algorithm>
 #include <filesystem>
 #include <iostream>
 #include <string>
+#include <vector>
 
 #include "platform/automation/error.h"
 #include "platform/automation/registry.h"
 #include "platform/automation/variant.h"
+#include "shell/serve.h"
 
 namespace fs = std::filesystem;
 
@@ -61,8 +65,18 @@ int smoke(const std::string& lib) {
 }  // namespace
 
 int main(int argc, char** argv) {
-    std::string cmd = argc > 1 ? argv[1] : "smoke";
+    std::string cmd = argc > 1 ? argv[1] : "serve";
     try {
+        if (cmd == "serve") {
+            std::string error;
+            auto options = pelta::shell::parseServeOptions(
+                std::vector<std::string>(argv + std::min(argc, 2), argv + argc), error);
+            if (!options) {
+                std::cerr << "pelta: " << error << "\nusage: " << pelta::shell::kServeUsage;
+                return 2;
+            }
+            return pelta::shell::serve(*options);
+        }
         if (cmd == "register" || cmd == "unregister") {
             std::string lib = argc > 2 ? argv[2] : defaultLibrary();
             return callEntry(lib, cmd == "register" ? "DllRegisterServer" : "DllUnregisterServer");
@@ -77,7 +91,10 @@ int main(int argc, char** argv) {
             return 0;
         }
         if (cmd == "smoke") return smoke(argc > 2 ? argv[2] : defaultLibrary());
-        std::cerr << "usage: pelta [register|unregister [LIBRARY]] | create PROGID | smoke\n";
+        std::cerr
+            << "usage: pelta [serve [OPTIONS]] | register|unregister [LIBRARY] | create PROGID"
+               " | smoke\n       "
+            << pelta::shell::kServeUsage;
         return 2;
     } catch (const pelta::Error& e) {
         std::cerr << "pelta: error " << e.number() << ": " << e.description() << "\n";

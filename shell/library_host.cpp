@@ -1,0 +1,100 @@
+#include "shell/library_host.h"
+
+#include <algorithm>
+#include <cctype>
+#include <filesystem>
+#include <system_error>
+
+#include "library/contracts/IZonTerminate.h"
+#include "platform/automation/error.h"
+#include "platform/automation/registry.h"
+#include "platform/automation/variant.h"
+#include "shell/log.h"
+
+namespace pelta::shell {
+
+namespace {
+
+bool startsWithNoCase(const std::string& s, const std::string& prefix) {
+    if (s.size() < prefix.size()) return false;
+    for (size_t i = 0; i < prefix.size(); ++i)
+        if (std::tolower(static_cast<unsigned char>(s[i])) !=
+            std::tolower(static_cast<unsigned char>(prefix[i])))
+            return false;
+    return true;
+}
+
+// Terminates an object through IZonTerminate, else late-bound by name.
+void terminateObject(pelta::Object* o) {
+    if (!o) return;
+    if (auto* t = pelta::query<PeltaNom15::IZonTerminate>(o)) {
+        bool cancel = false;
+        t->QueryTerminate(cancel);  // the person has gone: the answer cannot keep it
+        t->Terminate();
+        return;
+    }
+    pelta::Variant cancel(false);
+    pelta::callByName(o, "QueryTerminate", std::span(&cancel, 1));
+    pelta::callByName(o, "Terminate");
+}
+
+class Session final : public LibrarySession {
+public:
+    Session(const std::string& libraryName, const ListScreenFactory& factory, ScreenHost& host)
+        : factory_(factory), host_(host) {
+        dispatcher_ = pelta::createObject(libraryName + ".cFormDispatcher");
+    }
+
+    std::shared_ptr<Screen> openList(const std::string& id) override {
+        if (!factory_)
+            pelta::raise(pelta::errc::ClassNotAvailable,
+                         "Lists cannot be shown yet: the framework that hosts them is not part "
+                         "of this build",
+                         "pelta.shell");
+        return factory_(pelta::createObject(id), host_);
+    }
+
+    void terminate() override {
+        pelta::ObjectRef d = std::move(dispatcher_);
+        terminateObject(d.get());
+    }
+
+private:
+    const ListScreenFactory& factory_;
+    ScreenHost& host_;
+    pelta::ObjectRef dispatcher_;
+};
+
+}  // namespace
+
+LibraryHost::LibraryHost(std::string libraryFile, std::string libraryName)
+    : file_(std::move(libraryFile)), name_(std::move(libraryName)) {
+    auto reg = reinterpret_cast<pelta::DllRegisterServerFn>(
+        pelta::serverEntryPoint(file_, "DllRegisterServer"));
+    if (pelta::HResult hr = reg(); hr != pelta::kOk)
+        pelta::raise(hr, "DllRegisterServer of " + file_ + " failed", "pelta.shell");
+    std::string prefix = name_ + ".ctx";
+    for (const pelta::ClassEntry& e : pelta::ClassRegistry().entries()) {
+        std::error_code ec;
+        if (!startsWithNoCase(e.progId, prefix) || !std::filesystem::equivalent(e.path, file_, ec))
+            continue;
+        lists_.push_back(NavigationEntry{e.progId, e.progId.substr(name_.size() + 1), true});
+    }
+    std::sort(lists_.begin(), lists_.end(),
+              [](const NavigationEntry& a, const NavigationEntry& b) { return a.id < b.id; });
+    logLine("library " + file_ + ": " + std::to_string(lists_.size()) + " public lists");
+}
+
+std::vector<NavigationEntry> LibraryHost::navigation() {
+    std::vector<NavigationEntry> out = lists_;
+    if (!factory_)
+        for (auto& e : out)
+            e.available = false;
+    return out;
+}
+
+std::unique_ptr<LibrarySession> LibraryHost::startSession(ScreenHost& host) {
+    return std::make_unique<Session>(name_, factory_, host);
+}
+
+}  // namespace pelta::shell

@@ -1,0 +1,154 @@
+// A screen as the shell shows it: its caption, menu and toolbar commands,
+// declared controls and grids, and the rows of a grid one page at a time.
+// Every member runs on the session's user-interface thread.
+//
+// The framework's extenders are adapted to this interface: a list control's
+// form extender gives the caption and commands, its grid extender the columns
+// and the recordset that pages are cut from.
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "platform/automation/variant.h"
+
+namespace pelta::shell {
+
+class UserAgent;
+
+struct ColumnInfo {
+    std::string key;
+    std::string caption;
+    std::string field;
+    bool visible = true;
+    std::string format;
+    std::string editor;  // "", "text", "number", "date", "check", "combo", "selector"
+    int32_t width = 0;
+};
+
+struct GridInfo {
+    std::string name;
+    std::vector<ColumnInfo> columns;
+    int64_t rowCount = 0;
+};
+
+struct CommandInfo {
+    int32_t id = 0;
+    std::string caption;  // may hold "\t" and the shortcut's text, as menus do
+    std::string tooltip;
+    std::string shortcut;  // "Ctrl+N", "Del", "F5"; empty when none
+    bool enabled = true;
+};
+
+struct ControlInfo {
+    std::string name;
+    std::string kind;  // "text", "number", "date", "check", "combo", "note", "grid" ...
+    std::string caption;
+    std::string field;
+    std::string group;
+    std::string format;
+    std::string hint;
+    bool readOnly = false;
+    Variant value;
+    // Combos: the rows offered, as key and shown text.
+    std::vector<std::pair<std::string, std::string>> options;
+};
+
+struct SortKey {
+    std::string column;
+    bool descending = false;
+};
+
+struct Row {
+    int64_t index = 0;           // position in the grid's current order
+    std::string key;             // bookmark, stable across sorting
+    std::vector<Variant> cells;  // in the order of the grid's columns
+};
+
+struct RowsPage {
+    int64_t total = 0;
+    int64_t offset = 0;
+    std::vector<Row> rows;
+};
+
+// What the page asks of a screen when it runs a command: the grid row that is
+// current and the rows that are marked.
+struct CommandTarget {
+    std::string grid;
+    std::vector<std::string> selectedKeys;
+    std::string currentKey;
+};
+
+class Screen {
+public:
+    virtual ~Screen() = default;
+
+    virtual std::string kind() = 0;  // "list" or "detail"
+    virtual std::string caption() = 0;
+    virtual std::vector<CommandInfo> commands() = 0;
+    virtual std::vector<ControlInfo> controls() = 0;
+    virtual std::vector<GridInfo> grids() = 0;
+
+    // `count` rows from `offset` of `grid` in the order `sort` (empty: the
+    // grid's own order). Raises pelta::Error for an unknown grid or column.
+    virtual RowsPage rows(const std::string& grid, int64_t offset, int64_t count,
+                          const std::vector<SortKey>& sort) = 0;
+
+    // Runs a framework command (101 new, 102 open, 205 delete, 207 refresh ...).
+    // False when the screen does not offer it.
+    virtual bool execute(int32_t command, const CommandTarget& target) = 0;
+    // A control's value typed by the person. Raises for an unknown control.
+    virtual void setValue(const std::string& control, const Variant& value) = 0;
+    // Validates, uploads and saves; false when refused (a message said why).
+    virtual bool save() = 0;
+
+    // The termination protocol: may refuse (unsaved edits the person keeps).
+    virtual bool queryTerminate() = 0;
+    // Releases everything; the screen is not used afterwards.
+    virtual void terminate() = 0;
+};
+
+// What a screen may ask of the session hosting it.
+class ScreenHost {
+public:
+    virtual ~ScreenHost() = default;
+    virtual UserAgent& userAgent() = 0;
+    // Shows another screen (a detail form opened by a list); answers its id.
+    virtual int64_t openScreen(std::shared_ptr<Screen> screen) = 0;
+    // Tells the page that a screen's caption, values or commands changed.
+    virtual void screenChanged(Screen& screen) = 0;
+    // Tells the page that the rows of a grid changed.
+    virtual void gridChanged(Screen& screen, const std::string& grid) = 0;
+    // Closes a screen from its own code (after a delete in a detail form).
+    virtual void closeScreen(Screen& screen) = 0;
+};
+
+struct NavigationEntry {
+    std::string id;       // what the page sends back to open it ("PeltaNom15.ctxRatios")
+    std::string caption;  // shown in the navigation
+    bool available = true;
+};
+
+// The library as one session sees it: its entry object and the lists it
+// opened. Lives and dies on the session's user-interface thread.
+class LibrarySession {
+public:
+    virtual ~LibrarySession() = default;
+    // Creates and initialises a list control. Raises pelta::Error when it cannot.
+    virtual std::shared_ptr<Screen> openList(const std::string& id) = 0;
+    // Ends the session's hold on the library (the entry object's Terminate).
+    virtual void terminate() = 0;
+};
+
+// Where screens come from: the library's public list controls.
+class ScreenProvider {
+public:
+    virtual ~ScreenProvider() = default;
+    virtual std::vector<NavigationEntry> navigation() = 0;
+    // Called on the new session's user-interface thread.
+    virtual std::unique_ptr<LibrarySession> startSession(ScreenHost& host) = 0;
+};
+
+}  // namespace pelta::shell

@@ -1,0 +1,326 @@
+// The pelta page: the library's lists as navigation, every open screen in a
+// tab, its commands in a toolbar with their shortcuts, and the dialogs its
+// code asks for.
+import './style.css';
+import { ApiError, Connection } from './api.js';
+import { Dialogs } from './dialogs.js';
+import { renderForm } from './form.js';
+import { ListGrid } from './grid.js';
+
+const connection = new Connection();
+const dialogs = new Dialogs(document.getElementById('dialog'), connection);
+const screens = new Map(); // id -> { description, tab, view, grids: [ListGrid] }
+let active = null;
+
+const $ = (id) => document.getElementById(id);
+
+function status(text) {
+  $('status').textContent = text;
+}
+
+function reportError(e) {
+  if (e instanceof ApiError && e.status === 401) {
+    status('Сесията е приключила');
+    return;
+  }
+  dialogs.local(e.message || String(e));
+}
+
+// ---- shortcuts ---------------------------------------------------------------
+
+function keyName(e) {
+  const parts = [];
+  if (e.ctrlKey || e.metaKey) parts.push('Ctrl');
+  if (e.altKey) parts.push('Alt');
+  if (e.shiftKey) parts.push('Shift');
+  let key = e.key;
+  if (key === 'Delete') key = 'Del';
+  else if (key.length === 1) key = key.toUpperCase();
+  parts.push(key);
+  return parts.join('+');
+}
+
+document.addEventListener('keydown', (e) => {
+  if (dialogs.open || !active) return;
+  const screen = screens.get(active);
+  if (!screen) return;
+  const name = keyName(e);
+  // Del in a text field edits the text, not the list.
+  const typing = e.target instanceof HTMLElement && e.target.matches('input, textarea, select');
+  if (typing && !e.ctrlKey && !e.altKey && !/^F\d+$/.test(e.key)) return;
+  if (name === 'Ctrl+S' && screen.description.kind === 'detail') {
+    e.preventDefault();
+    save(screen);
+    return;
+  }
+  const command = screen.description.commands.find((c) => c.enabled && c.shortcut === name);
+  if (command) {
+    e.preventDefault();
+    execute(screen, command.id);
+  }
+});
+
+// ---- screens -------------------------------------------------------------------
+
+async function execute(screen, command) {
+  const grid = screen.grids[0];
+  const body = { command };
+  if (grid) {
+    body.grid = grid.name;
+    body.current = grid.currentKey();
+    body.selected = grid.selectedKeys();
+  }
+  try {
+    await connection.post(`/api/screens/${screen.description.id}/execute`, body);
+  } catch (e) {
+    reportError(e);
+  }
+}
+
+async function save(screen) {
+  // A field being edited sends its change first.
+  if (document.activeElement instanceof HTMLElement) document.activeElement.blur();
+  try {
+    const reply = await connection.post(`/api/screens/${screen.description.id}/save`);
+    status(reply.saved ? 'Записано' : 'Не е записано');
+  } catch (e) {
+    reportError(e);
+  }
+}
+
+function toolbar(screen) {
+  const bar = document.createElement('div');
+  bar.className = 'toolbar';
+  bar.setAttribute('role', 'toolbar');
+  const d = screen.description;
+  if (d.kind === 'detail') {
+    const b = document.createElement('button');
+    b.textContent = 'Запис';
+    b.title = 'Запис (Ctrl+S)';
+    b.dataset.command = 'save';
+    b.addEventListener('click', () => save(screen));
+    bar.append(b);
+  }
+  for (const c of d.commands) {
+    if (d.kind === 'detail' && c.id === 201) continue; // the save button above
+    const b = document.createElement('button');
+    b.textContent = c.caption;
+    b.title = c.tooltip || c.caption;
+    b.disabled = !c.enabled;
+    b.dataset.command = String(c.id);
+    if (c.shortcut) {
+      const k = document.createElement('kbd');
+      k.textContent = c.shortcut;
+      b.append(' ', k);
+    }
+    b.addEventListener('click', () => execute(screen, c.id));
+    bar.append(b);
+  }
+  const close = document.createElement('button');
+  close.className = 'close';
+  close.textContent = '✕';
+  close.title = 'Затваряне';
+  close.addEventListener('click', () => closeScreen(d.id));
+  bar.append(close);
+  return bar;
+}
+
+function render(screen) {
+  const d = screen.description;
+  screen.tab.querySelector('.tab-caption').textContent = d.caption;
+  for (const g of screen.grids) g.destroy();
+  screen.grids = [];
+  screen.view.replaceChildren(toolbar(screen));
+  screen.view.dataset.kind = d.kind;
+  if (d.kind === 'detail') {
+    const form = document.createElement('form');
+    form.className = 'detail';
+    form.addEventListener('submit', (e) => e.preventDefault());
+    renderForm(form, d, async (control, value) => {
+      try {
+        await connection.post(`/api/screens/${d.id}/values`, { control: control.name, value });
+      } catch (e) {
+        reportError(e);
+      }
+    });
+    screen.view.append(form);
+  }
+  for (const g of d.grids) {
+    const holder = document.createElement('div');
+    holder.className = 'grid';
+    holder.dataset.grid = g.name;
+    screen.view.append(holder);
+    const footer = document.createElement('div');
+    footer.className = 'footer';
+    screen.view.append(footer);
+    const grid = new ListGrid(holder, connection, d, g, {
+      onOpen: () => {
+        const open = d.commands.find((c) => c.id === 102 && c.enabled);
+        if (open) execute(screen, 102);
+      },
+      onTotal: (total) => (footer.textContent = `Записи: ${total.toLocaleString('bg-BG')}`),
+      onError: reportError,
+    });
+    screen.grids.push(grid);
+  }
+}
+
+function activate(id) {
+  active = id;
+  for (const [sid, s] of screens) {
+    const on = sid === id;
+    s.tab.classList.toggle('active', on);
+    s.tab.setAttribute('aria-selected', String(on));
+    s.view.hidden = !on;
+  }
+}
+
+const loading = new Map(); // id -> promise of showScreen, so that a screen is drawn once at a time
+
+// Draws a screen anew; `bringForward` for a screen opened (not one that only changed).
+function showScreen(id, bringForward = true) {
+  const prior = loading.get(id) ?? Promise.resolve();
+  const next = prior.then(() => drawScreen(id, bringForward));
+  loading.set(id, next);
+  next.finally(() => {
+    if (loading.get(id) === next) loading.delete(id);
+  });
+  return next;
+}
+
+async function drawScreen(id, bringForward) {
+  let description;
+  try {
+    description = await connection.get(`/api/screens/${id}`);
+  } catch (e) {
+    if (e.status !== 404) reportError(e);
+    return;
+  }
+  let screen = screens.get(id);
+  if (!screen) {
+    const tab = document.createElement('button');
+    tab.className = 'tab';
+    tab.setAttribute('role', 'tab');
+    tab.dataset.screen = String(id);
+    const caption = document.createElement('span');
+    caption.className = 'tab-caption';
+    tab.append(caption);
+    tab.addEventListener('click', () => activate(id));
+    $('tabs').append(tab);
+    const view = document.createElement('section');
+    view.className = 'screen';
+    view.dataset.screen = String(id);
+    $('screens').append(view);
+    screen = { description, tab, view, grids: [] };
+    screens.set(id, screen);
+  }
+  const isNew = !screen.drawn;
+  screen.description = description;
+  render(screen);
+  screen.drawn = true;
+  if (bringForward || isNew) activate(id);
+  else screen.view.hidden = active !== id;
+}
+
+function removeScreen(id) {
+  const s = screens.get(id);
+  if (!s) return;
+  for (const g of s.grids) g.destroy();
+  s.tab.remove();
+  s.view.remove();
+  screens.delete(id);
+  if (active === id) activate(screens.size ? [...screens.keys()].at(-1) : null);
+}
+
+async function closeScreen(id) {
+  try {
+    const reply = await connection.del(`/api/screens/${id}`);
+    if (reply.closed) removeScreen(id);
+  } catch (e) {
+    reportError(e);
+  }
+}
+
+async function openList(entry) {
+  try {
+    const d = await connection.post('/api/lists', { id: entry.id });
+    if (!screens.has(d.id) && !loading.has(d.id)) await showScreen(d.id);
+    else activate(d.id);
+  } catch (e) {
+    reportError(e);
+  }
+}
+
+// ---- start ---------------------------------------------------------------------
+
+async function loadNavigation() {
+  const { lists } = await connection.get('/api/navigation');
+  const ul = $('lists');
+  ul.replaceChildren();
+  for (const entry of lists) {
+    const li = document.createElement('li');
+    const a = document.createElement('a');
+    a.href = '#';
+    a.textContent = entry.caption;
+    a.dataset.list = entry.id;
+    if (!entry.available) a.classList.add('unavailable');
+    a.addEventListener('click', (e) => {
+      e.preventDefault();
+      openList(entry);
+    });
+    li.append(a);
+    ul.append(li);
+  }
+}
+
+function listen() {
+  connection.listen({
+    dialog: (d) => dialogs.show(d),
+    'dialog-closed': (d) => dialogs.closed(d.id),
+    screen: (e) => {
+      if (e.change === 'closed') removeScreen(e.screen);
+      else if (e.change === 'opened' && (screens.has(e.screen) || loading.has(e.screen))) activate(e.screen);
+      else showScreen(e.screen, e.change === 'opened');
+    },
+    refresh: (e) => {
+      const s = screens.get(e.screen);
+      for (const g of s ? s.grids : []) if (!e.grid || g.name === e.grid) g.refresh();
+    },
+    closed: () => {
+      status('Сесията е приключила');
+      connection.events.close();
+    },
+    error: () => status(connection.events.readyState === 2 ? 'Няма връзка' : 'Свързване...'),
+  });
+  connection.events.onopen = () => status('');
+}
+
+async function start(password) {
+  await connection.start(password);
+  connection.closeOnExit();
+  listen();
+  await loadNavigation();
+  document.body.dataset.ready = 'true';
+}
+
+async function main() {
+  const info = await connection.request('GET', '/api/info', undefined, false);
+  document.title = 'Pelta';
+  if (!info.login) {
+    await start();
+    return;
+  }
+  const login = $('login');
+  login.hidden = false;
+  $('login-form').addEventListener('submit', async (e) => {
+    e.preventDefault();
+    try {
+      await start(new FormData(e.target).get('password'));
+      login.hidden = true;
+    } catch (err) {
+      $('login-error').textContent = err.status === 401 ? 'Грешна парола' : err.message;
+    }
+  });
+}
+
+main().catch(reportError);

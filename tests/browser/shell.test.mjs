@@ -1,0 +1,238 @@
+// The pelta shell in a real browser: Debian's Chromium, headless, driven by
+// playwright-core. Run through scripts/browser-test.sh (which builds what it
+// needs) or with PELTA_BUILD_DIR and PELTA_WEB_DIR set:
+//   node --test tests/browser/shell.test.mjs
+//
+// Two servers are driven:
+//  * `pelta serve` on a temporary database: the page, the library's lists as
+//    navigation and the error a list shows while it cannot be opened;
+//  * the shell over its fixture screens (shell_fixture_server): a list of a
+//    million rows paged from the server, sorting, shortcuts, a detail form
+//    with its validation message, questions and input boxes as modal dialogs,
+//    and the release of a closed tab's session.
+//
+// TODO(ctxRatios): once the framework, the service and the currency-rate
+// screens are in the build, drive `pelta serve` through the rate scenario:
+//   1. open the page; click "ctxRatios" (caption "Валутни курсове") in the navigation;
+//   2. the grid shows the demo database's rates; press Ctrl+N (command 101);
+//   3. in frmRatiosDetails pick a bank in the "Изберете банка" drop-down, set
+//      the date, enter a unit and a rate in a currency row;
+//   4. press Ctrl+S; the form saves (UpdNomCurrRatiosDetails) and the list
+//      refreshes; the new rate's row is in the grid;
+//   5. select an inactive rate, press Del (command 205): the question
+//      "Желаете ли да изтриете избраните неактивни номенклатури?" shows with
+//      Yes/No; answer "Не" and see the row stay, then "Да" and see it go;
+//   6. take a screenshot.
+import { after, before, describe, test } from 'node:test';
+import assert from 'node:assert/strict';
+import { spawn } from 'node:child_process';
+import { mkdtempSync, mkdirSync, rmSync } from 'node:fs';
+import { tmpdir } from 'node:os';
+import path from 'node:path';
+import { fileURLToPath } from 'node:url';
+import { chromium } from 'playwright-core';
+
+const here = path.dirname(fileURLToPath(import.meta.url));
+const root = path.resolve(here, '../..');
+const buildDir = process.env.PELTA_BUILD_DIR ?? path.join(root, 'build/debug');
+const webDir = process.env.PELTA_WEB_DIR ?? path.join(root, 'shell/web/dist');
+const shotDir = process.env.PELTA_SCREENSHOTS ?? path.join(buildDir, 'screenshots');
+mkdirSync(shotDir, { recursive: true });
+
+const CHROMIUM_ARGS = [
+  '--headless',
+  '--no-sandbox',
+  '--disable-gpu',
+  '--disable-quic',
+  '--no-first-run',
+  '--disable-background-networking',
+  '--disable-component-update',
+  '--disable-sync',
+];
+
+// Starts a server that prints "serving on http://...", answers its address and process.
+function startServer(program, args, env) {
+  return new Promise((resolve, reject) => {
+    const child = spawn(program, args, { env: { ...process.env, ...env }, stdio: ['ignore', 'pipe', 'pipe'] });
+    let out = '';
+    let err = '';
+    const timer = setTimeout(() => reject(new Error(`${program} did not start:\n${out}\n${err}`)), 30000);
+    child.stdout.on('data', (d) => {
+      out += d;
+      const m = out.match(/serving on (http:\/\/\S+)/);
+      if (m) {
+        clearTimeout(timer);
+        resolve({ url: m[1], child, output: () => out, errors: () => err });
+      }
+    });
+    child.stderr.on('data', (d) => (err += d));
+    child.on('exit', (code) => {
+      clearTimeout(timer);
+      reject(new Error(`${program} exited with ${code}:\n${out}\n${err}`));
+    });
+  });
+}
+
+function stopServer(server) {
+  return new Promise((resolve) => {
+    server.child.removeAllListeners('exit');
+    server.child.on('exit', () => resolve(server.output()));
+    server.child.kill('SIGTERM');
+  });
+}
+
+async function launchBrowser() {
+  const profile = mkdtempSync(path.join(tmpdir(), 'pelta-chromium-'));
+  const context = await chromium.launchPersistentContext(profile, {
+    executablePath: process.env.CHROMIUM ?? '/usr/bin/chromium',
+    headless: true,
+    args: CHROMIUM_ARGS,
+    viewport: { width: 1280, height: 800 },
+    locale: 'bg-BG',
+  });
+  return { context, close: async () => { await context.close(); rmSync(profile, { recursive: true, force: true }); } };
+}
+
+// The dialog now shown, and a click on one of its buttons.
+async function answerDialog(page, expectedText, buttonText) {
+  const dialog = page.locator('dialog[open]');
+  await dialog.waitFor();
+  await assert.doesNotReject(dialog.getByText(expectedText, { exact: false }).waitFor());
+  await dialog.getByRole('button', { name: buttonText, exact: true }).click();
+  await dialog.waitFor({ state: 'hidden' });
+}
+
+describe('pelta serve', () => {
+  let work, server, browser;
+  before(async () => {
+    work = mkdtempSync(path.join(tmpdir(), 'pelta-serve-'));
+    server = await startServer(path.join(buildDir, 'bin/pelta'),
+      ['serve', '--port', '0', '--db', path.join(work, 'demo.sqlite'), '--web', webDir],
+      { PELTA_REGISTRY: path.join(work, 'registry.ini'), XDG_DATA_HOME: work });
+    browser = await launchBrowser();
+  });
+  after(async () => {
+    await browser?.close();
+    if (server) await stopServer(server);
+    rmSync(work, { recursive: true, force: true });
+  });
+
+  test('the page offers the library\'s public lists', async () => {
+    const page = await browser.context.newPage();
+    await page.goto(server.url);
+    await page.locator('body[data-ready=true]').waitFor();
+    const lists = await page.locator('#lists a').allTextContents();
+    for (const name of ['ctxItems', 'ctxContragents', 'ctxRatios', 'ctxPriceLists'])
+      assert.ok(lists.includes(name), `${name} in ${lists}`);
+    // Until the framework is in the build a list cannot open, and the page says why.
+    await page.locator('#lists a[data-list="PeltaNom15.ctxRatios"]').click();
+    await answerDialog(page, 'framework', 'OK');
+    await page.screenshot({ path: path.join(shotDir, 'pelta-serve.png') });
+    await page.close();
+  });
+});
+
+describe('the shell over its fixture screens', () => {
+  let server, browser, page;
+  const pages = [];
+  before(async () => {
+    server = await startServer(path.join(buildDir, 'bin/shell_fixture_server'),
+      ['--port', '0', '--rows', '1000000', '--web', webDir, '--session-timeout', '5'], {});
+    browser = await launchBrowser();
+    page = await browser.context.newPage();
+    page.on('request', (r) => {
+      const u = new URL(r.url());
+      if (u.pathname.endsWith('/rows')) pages.push(Number(u.searchParams.get('count')));
+    });
+    await page.goto(server.url);
+    await page.locator('body[data-ready=true]').waitFor();
+  });
+  after(async () => {
+    await browser?.close();
+    if (server) await stopServer(server);
+  });
+
+  const list = () => page.locator('section.screen[data-kind=list]');
+  const rowWith = (text) => list().locator('.ag-row', { hasText: text }).first();
+
+  test('a million rows page from the server, only the visible ones travel', async () => {
+    await page.locator('#lists a', { hasText: 'Числа' }).click();
+    await rowWith('Ред 1').waitFor();
+    await assert.doesNotReject(list().locator('.footer', { hasText: /1\D?000\D?000/ }).waitFor());
+    // To the end of the list and back: the grid asks only for the blocks in view.
+    const viewport = list().locator('.ag-grid-viewport');
+    await viewport.evaluate((el) => (el.scrollTop = el.scrollHeight));
+    await rowWith('Ред 1000000').waitFor();
+    await viewport.evaluate((el) => (el.scrollTop = 0));
+    await rowWith('Ред 1').waitFor();
+    const travelled = pages.reduce((a, b) => a + b, 0);
+    assert.ok(pages.every((n) => n <= 100), `page sizes ${pages}`);
+    assert.ok(travelled < 2000, `${travelled} rows travelled`);
+  });
+
+  test('sorting happens on the server', async () => {
+    const code = list().locator('.ag-header-cell', { hasText: 'Код' });
+    await code.click(); // ascending
+    await code.click(); // descending
+    await list().locator('.ag-row[row-index="0"]', { hasText: 'Ред 1000000' }).waitFor({ timeout: 60000 });
+    await code.click(); // back to the server's own order
+    await list().locator('.ag-row[row-index="0"]', { hasText: 'Ред 1' }).waitFor({ timeout: 60000 });
+  });
+
+  test('Ctrl+N opens a detail form; saving checks it and adds the row', async () => {
+    await rowWith('Ред 1').click();
+    await page.keyboard.press('Control+n');
+    const form = page.locator('section.screen[data-kind=detail]');
+    await form.waitFor();
+    assert.equal(await form.locator('[data-control=txtName]').getAttribute('placeholder'), 'Въведете име');
+    // Without a name the form refuses with a message at the name field.
+    await page.keyboard.press('Control+s');
+    await answerDialog(page, 'Моля въведете име', 'OK');
+    await form.locator('[data-control=txtName]').fill('Тестово число');
+    await form.locator('[data-control=txtAmount]').fill('12.50');
+    await page.keyboard.press('Control+s');
+    await page.locator('#status', { hasText: 'Записано' }).waitFor();
+    await page.locator('.tab', { hasText: 'Числа' }).click();
+    await list().locator('.footer', { hasText: /1\D?000\D?001/ }).waitFor();
+    const viewport = list().locator('.ag-grid-viewport');
+    await viewport.evaluate((el) => (el.scrollTop = el.scrollHeight));
+    await rowWith('Тестово число').waitFor();
+  });
+
+  test('Del asks a Yes/No question; the answer decides', async () => {
+    await rowWith('Тестово число').click();
+    await page.keyboard.press('Delete');
+    await answerDialog(page, 'Желаете ли да изтриете избраните числа?', 'Не');
+    await list().locator('.footer', { hasText: /1\D?000\D?001/ }).waitFor();
+    await rowWith('Тестово число').click();
+    await page.keyboard.press('Delete');
+    await answerDialog(page, 'Желаете ли да изтриете избраните числа?', 'Да');
+    await list().locator('.footer', { hasText: /1\D?000\D?000$/ }).waitFor();
+  });
+
+  test('an input box carries the text typed into the page', async () => {
+    const viewport = list().locator('.ag-grid-viewport');
+    await viewport.evaluate((el) => (el.scrollTop = 0));
+    await rowWith('Ред 2').click();
+    await list().locator('button[data-command="300"]').click();
+    const dialog = page.locator('dialog[open][data-kind=input]');
+    await dialog.locator('input[name=value]').fill('Преименуван ред');
+    await page.screenshot({ path: path.join(shotDir, 'shell-input-box.png') });
+    await dialog.getByRole('button', { name: 'OK', exact: true }).click();
+    await rowWith('Преименуван ред').waitFor();
+    await page.screenshot({ path: path.join(shotDir, 'shell-list.png') });
+  });
+
+  test('a closed tab releases its session and terminates its screens', async () => {
+    await page.close({ runBeforeUnload: true });
+    let output = '';
+    // The beacon of the closing tab ends the session; the server reports on exit.
+    await new Promise((r) => setTimeout(r, 1000));
+    output = await stopServer(server);
+    server = null;
+    const m = output.match(/sessions terminated: (\d+), screens terminated: (\d+)/);
+    assert.ok(m, output);
+    assert.equal(Number(m[1]), 1);
+    assert.ok(Number(m[2]) >= 2, output); // the list and its detail form
+  });
+});
