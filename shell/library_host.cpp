@@ -113,8 +113,10 @@ LibraryHost::LibraryHost(std::string libraryFile, std::string libraryName)
         }
         lists_.push_back(NavigationEntry{e.progId, knownCaption(object), available});
     }
-    std::sort(lists_.begin(), lists_.end(),
-              [](const NavigationEntry& a, const NavigationEntry& b) { return a.id < b.id; });
+    // The lists that open first, each group by identifier.
+    std::sort(lists_.begin(), lists_.end(), [](const NavigationEntry& a, const NavigationEntry& b) {
+        return a.available != b.available ? a.available : a.id < b.id;
+    });
     logLine("library " + file_ + ": " + std::to_string(lists_.size()) + " public lists");
 }
 
