@@ -213,7 +213,9 @@ bool FormExtender::ShowDocument(const std::string& Key) {
     key_ = Key;
     shown_ = true;
     closed_ = false;
-    return fetchAndFill();
+    if (!fetchAndFill()) return false;
+    if (auto agent = currentUserAgent()) agent->documentShown(*this);
+    return true;
 }
 
 bool FormExtender::movePosition(const pelta::Variant& bookmark) {

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "framework/services.h"
 #include "platform/automation/error.h"
 #include "platform/data/recordset.h"
 
@@ -48,8 +49,13 @@ bool showsAllGroups(const pelta::Variant& v) {
 
 }  // namespace
 
-GridExtender::GridExtender() = default;
-GridExtender::~GridExtender() = default;
+GridExtender::GridExtender() {
+    services()->addGrid(this);
+}
+
+GridExtender::~GridExtender() {
+    services()->removeGrid(this);
+}
 
 RecordsetRef GridExtender::Rows() {
     return rows_;
@@ -75,6 +81,37 @@ void GridExtender::DeclareColumns(const std::vector<ColumnDecl>& Columns) {
                                  "\" twice or without a key",
                              "GridExtender.DeclareColumns");
     columns_ = Columns;
+}
+
+void GridExtender::SetColumnList(const std::string& Column, RecordsetRef Rows,
+                                 const std::string& KeyField,
+                                 const std::vector<std::string>& ShownFields) {
+    auto it = std::find_if(columns_.begin(), columns_.end(),
+                           [&](const ColumnDecl& c) { return sameAscii(c.Key, Column); });
+    if (it == columns_.end())
+        pelta::raise(pelta::errc::InvalidProcedureCall,
+                     "The grid " + gridName_ + " has no column " + Column,
+                     "GridExtender.SetColumnList");
+    if (!Rows) {
+        lists_.erase(it->Key);
+        return;
+    }
+    auto check = [&](const std::string& field) {
+        if (Rows->fieldIndex(field) < 0)
+            pelta::raise(pelta::errc::InvalidProcedureCall,
+                         "The rows offered in " + it->Key + " have no field " + field,
+                         "GridExtender.SetColumnList");
+    };
+    check(KeyField);
+    for (const auto& f : ShownFields)
+        check(f);
+    lists_[it->Key] = ColumnList{std::move(Rows), KeyField, ShownFields};
+}
+
+const GridExtender::ColumnList* GridExtender::columnList(const std::string& column) const {
+    for (const auto& [key, list] : lists_)
+        if (sameAscii(key, column)) return &list;
+    return nullptr;
 }
 
 // ---- binding and filters ------------------------------------------------------------

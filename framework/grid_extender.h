@@ -5,6 +5,7 @@
 #pragma once
 
 #include <cstdint>
+#include <map>
 #include <set>
 #include <string>
 #include <vector>
@@ -32,6 +33,10 @@ public:
     std::string GridName() override { return gridName_; }
     void DeclareColumns(const std::vector<PeltaNom15::ColumnDecl>& Columns) override;
     std::vector<PeltaNom15::ColumnDecl> Columns() override { return columns_; }
+    // Raises InvalidProcedureCall for an undeclared column or a field the
+    // rows lack; null rows take the list away.
+    void SetColumnList(const std::string& Column, RecordsetRef Rows, const std::string& KeyField,
+                       const std::vector<std::string>& ShownFields) override;
 
     // Empty or "(Всички)" shows every group; another value shows that group.
     // The grid stands on its first row; the marks are cleared.
@@ -64,6 +69,14 @@ public:
     bool DeleteRows() override;
 
     // ---- For hosts and renderers ----------------------------------------------
+
+    // The rows a combo column offers, as the screen set them; null when none.
+    struct ColumnList {
+        RecordsetRef rows;
+        std::string keyField;
+        std::vector<std::string> shownFields;
+    };
+    const ColumnList* columnList(const std::string& column) const;
 
     int32_t helpID() const noexcept { return helpID_; }
     const std::string& layoutKey() const noexcept { return layoutKey_; }
@@ -113,6 +126,7 @@ private:
     int32_t helpID_ = 0;
     std::string layoutKey_;
     std::vector<PeltaNom15::ColumnDecl> columns_;
+    std::map<std::string, ColumnList> lists_;  // by column key
     RecordsetRef rows_;
     RecordsetRef view_;
     std::string groupColumn_;

@@ -120,7 +120,7 @@ pelta::ObjectRef RecordDeletion::FindDetailForm(IFormExtender* ListForm) {
     auto detailClass = ListForm->DetailFormClass();
     if (detailClass.empty()) return nullptr;
     auto site = ListForm->ClientSite();
-    for (auto* form : services()->forms()) {
+    for (auto* form : services()->threadForms()) {
         if (form == ListForm || form->closed() || !form->owner()) continue;
         if (!sameAscii(form->ObjectName(), detailClass)) continue;
         if (form->ClientSite().get() != site.get()) continue;

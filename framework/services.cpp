@@ -4,6 +4,7 @@
 #include <system_error>
 
 #include "framework/form_extender.h"
+#include "framework/grid_extender.h"
 #include "framework/record_deletion.h"
 #include "platform/automation/error.h"
 #include "platform/automation/registry.h"
@@ -367,25 +368,61 @@ void FrameworkServices::allowObject(const std::string& progId) {
 
 void FrameworkServices::addForm(FormExtender* form) {
     std::lock_guard lock(mutex_);
-    forms_.push_back(form);
+    forms_.emplace_back(form, std::this_thread::get_id());
 }
 
 void FrameworkServices::removeForm(FormExtender* form) {
     std::lock_guard lock(mutex_);
-    forms_.erase(std::remove(forms_.begin(), forms_.end(), form), forms_.end());
+    forms_.erase(std::remove_if(forms_.begin(), forms_.end(),
+                                [&](const auto& f) { return f.first == form; }),
+                 forms_.end());
 }
 
 std::vector<FormExtender*> FrameworkServices::forms() const {
     std::lock_guard lock(mutex_);
-    return forms_;
+    std::vector<FormExtender*> out;
+    for (const auto& f : forms_)
+        out.push_back(f.first);
+    return out;
+}
+
+std::vector<FormExtender*> FrameworkServices::threadForms() const {
+    const auto self = std::this_thread::get_id();
+    std::lock_guard lock(mutex_);
+    std::vector<FormExtender*> out;
+    for (const auto& f : forms_)
+        if (f.second == self) out.push_back(f.first);
+    return out;
 }
 
 FormExtender* FrameworkServices::formOfOwner(const pelta::Object* owner) const {
     if (!owner) return nullptr;
     std::lock_guard lock(mutex_);
-    for (auto* f : forms_)
-        if (f->owner() == owner) return f;
+    for (const auto& f : forms_)
+        if (f.first->owner() == owner) return f.first;
     return nullptr;
+}
+
+void FrameworkServices::addGrid(GridExtender* grid) {
+    std::lock_guard lock(mutex_);
+    grids_.emplace_back(grid, std::this_thread::get_id());
+}
+
+void FrameworkServices::removeGrid(GridExtender* grid) {
+    std::lock_guard lock(mutex_);
+    grids_.erase(std::remove_if(grids_.begin(), grids_.end(),
+                                [&](const auto& g) { return g.first == grid; }),
+                 grids_.end());
+}
+
+std::vector<GridExtender*> FrameworkServices::gridsOfOwner(const pelta::Object* owner) const {
+    std::vector<GridExtender*> out;
+    if (!owner) return out;
+    const auto self = std::this_thread::get_id();
+    std::lock_guard lock(mutex_);
+    for (const auto& g : grids_)
+        if (g.second == self && g.first->owner() == owner) out.push_back(g.first);
+    return out;
 }
 
 void FrameworkServices::reset() {

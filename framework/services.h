@@ -10,6 +10,8 @@
 #include <mutex>
 #include <set>
 #include <string>
+#include <thread>
+#include <utility>
 #include <vector>
 
 #include "framework/user_agent.h"
@@ -18,6 +20,7 @@
 namespace pelta::fw {
 
 class FormExtender;
+class GridExtender;
 class RecordDeletion;
 
 // Writes the host's log files: each Open appends to the named file.
@@ -166,12 +169,25 @@ public:
     void refuseObject(const std::string& progId);
     void allowObject(const std::string& progId);
 
-    // Live form extenders (each registers itself while it lives).
+    // Live form extenders (each registers itself while it lives), with the
+    // thread that made them: screens live on one user-interface thread, and
+    // a host with several (the web shell, one per browser session) looks only
+    // at its own thread's forms, which no other thread can destroy meanwhile.
     void addForm(FormExtender* form);
     void removeForm(FormExtender* form);
     std::vector<FormExtender*> forms() const;
+    // The live forms made on the calling thread.
+    std::vector<FormExtender*> threadForms() const;
     // The form extender whose owner is `owner`, or null.
     FormExtender* formOfOwner(const pelta::Object* owner) const;
+
+    // Live grid extenders, registered as forms are, so that a host finds the
+    // grids of a screen it did not make (a detail form opened by a list).
+    void addGrid(GridExtender* grid);
+    void removeGrid(GridExtender* grid);
+    // The grids made on the calling thread whose owner is `owner`, in the
+    // order they were made.
+    std::vector<GridExtender*> gridsOfOwner(const pelta::Object* owner) const;
 
     // Back to a fresh state: default host, no agent, empty settings in
     // memory, nothing refused, pointer 0. Live forms stay registered.
@@ -186,7 +202,8 @@ private:
     pelta::Ref<fw::RecordDeletion> deletion_;
     SettingsStore settings_;
     std::set<std::string> refused_;  // lower-case
-    std::vector<FormExtender*> forms_;
+    std::vector<std::pair<FormExtender*, std::thread::id>> forms_;
+    std::vector<std::pair<GridExtender*, std::thread::id>> grids_;
     int32_t mousePointer_ = 0;
 };
 

@@ -43,6 +43,8 @@ std::vector<int32_t> buttonsOfStyle(int32_t style);
 // True when the style offers a choice (more than the OK button).
 bool isQuestion(int32_t style);
 
+class FormExtender;
+
 class UserAgent : public virtual pelta::Object {
 public:
     // Shows a message box; answers the button pressed.
@@ -51,6 +53,10 @@ public:
     virtual void anchoredMessage(const Prompt& prompt) = 0;
     // Asks for a value; nullopt when cancelled.
     virtual std::optional<pelta::Variant> inputBox(const Prompt& prompt) = 0;
+    // A form has shown a document (a detail form opened by its list, or
+    // moved to another record): a host with windows brings it forward. The
+    // default does nothing, as a test needs nothing shown.
+    virtual void documentShown(FormExtender& form) { (void)form; }
 };
 
 // Thrown by the scripted agent when a screen asks what the test did not

@@ -109,6 +109,13 @@ std::string shortcutOf(const CommandInfo& c) {
     return {};
 }
 
+json describeOptions(const std::vector<std::pair<std::string, std::string>>& options) {
+    json out = json::array();
+    for (const auto& [key, text] : options)
+        out.push_back({{"key", key}, {"text", text}});
+    return out;
+}
+
 json describeColumns(const std::vector<ColumnInfo>& columns) {
     json out = json::array();
     for (const ColumnInfo& c : columns)
@@ -118,7 +125,8 @@ json describeColumns(const std::vector<ColumnInfo>& columns) {
                        {"visible", c.visible},
                        {"format", c.format},
                        {"editor", c.editor},
-                       {"width", c.width}});
+                       {"width", c.width},
+                       {"options", describeOptions(c.options)}});
     return out;
 }
 
@@ -134,9 +142,6 @@ json describeScreen(int64_t id, Screen& s) {
     }
     json controls = json::array();
     for (const ControlInfo& c : s.controls()) {
-        json options = json::array();
-        for (const auto& [key, text] : c.options)
-            options.push_back({{"key", key}, {"text", text}});
         controls.push_back({{"name", c.name},
                             {"kind", c.kind},
                             {"caption", c.caption},
@@ -144,14 +149,20 @@ json describeScreen(int64_t id, Screen& s) {
                             {"group", c.group},
                             {"format", c.format},
                             {"hint", c.hint},
+                            {"prompt", c.prompt},
                             {"readOnly", c.readOnly},
                             {"value", toJson(c.value)},
-                            {"options", options}});
+                            {"options", describeOptions(c.options)}});
     }
     json grids = json::array();
     for (const GridInfo& g : s.grids())
-        grids.push_back(
-            {{"name", g.name}, {"columns", describeColumns(g.columns)}, {"rowCount", g.rowCount}});
+        grids.push_back({{"name", g.name},
+                         {"columns", describeColumns(g.columns)},
+                         {"rowCount", g.rowCount},
+                         {"editable", g.editable},
+                         {"groupColumn", g.groupColumn},
+                         {"groups", g.groups},
+                         {"group", g.group}});
     return {{"id", id},
             {"kind", s.kind()},
             {"caption", s.caption()},
@@ -263,14 +274,20 @@ ApiResponse Api::route(const ApiRequest& r) {
     }
     if (what == "session" && p.size() == 2 && m == "POST") {
         json body = parseBody(r);
+        std::string user;
         if (options_.requireLogin) {
+            user = stringField(body, "user", false);
             std::string password = stringField(body, "password", false);
-            if (!constantTimeEquals(password, options_.password)) {
+            bool known = !user.empty() && user.size() <= 100 &&
+                         (!options_.userExists || options_.userExists(user));
+            // Both checks run, so that a wrong user and a wrong password take as long.
+            bool right = constantTimeEquals(password, options_.password);
+            if (!known || !right) {
                 std::this_thread::sleep_for(std::chrono::milliseconds(300));  // slows guessing
-                throw ApiError(401, "Wrong password");
+                throw ApiError(401, "Wrong user name or password");
             }
         }
-        auto session = sessions_.create();
+        auto session = sessions_.create(user);
         if (!session) throw ApiError(503, "Too many sessions");
         ApiResponse resp = ok({{"session", session->id()}}, 201);
         resp.setCookie = "pelta_session=" + session->id() + "; Path=/; HttpOnly; SameSite=Strict";
@@ -397,6 +414,59 @@ ApiResponse Api::route(const ApiRequest& r) {
 
     if (m != "POST") throw ApiError(405, "Method not allowed");
     json body = parseBody(r);
+    auto findGrid = [&](Screen& screen, const std::string& name) {
+        std::vector<GridInfo> grids = screen.grids();
+        auto grid = std::find_if(grids.begin(), grids.end(),
+                                 [&](const GridInfo& g) { return name.empty() || g.name == name; });
+        if (grid == grids.end()) throw ApiError(400, "Unknown grid");
+        return *grid;
+    };
+    if (action == "addrow") {
+        std::string gridName = stringField(body, "grid", false);
+        return ok(s.ui().call([&] {
+            auto screen = needScreen();
+            GridInfo grid = findGrid(*screen, gridName);
+            if (!grid.editable) throw ApiError(400, "The grid cannot be edited");
+            std::string key = screen->addRow(grid.name);
+            return json{{"added", !key.empty()}, {"key", key}};
+        }));
+    }
+    if (action == "cells") {
+        std::string gridName = stringField(body, "grid", false);
+        std::string row = stringField(body, "row", true);
+        std::string column = stringField(body, "column", true);
+        if (!body.contains("value")) throw ApiError(400, "Missing field \"value\"");
+        const json& value = body["value"];
+        if (!value.is_primitive()) throw ApiError(400, "Field \"value\" must be a plain value");
+        return ok(s.ui().call([&] {
+            auto screen = needScreen();
+            GridInfo grid = findGrid(*screen, gridName);
+            if (!grid.editable) throw ApiError(400, "The grid cannot be edited");
+            auto c = std::find_if(grid.columns.begin(), grid.columns.end(),
+                                  [&](const ColumnInfo& ci) { return ci.key == column; });
+            if (c == grid.columns.end()) throw ApiError(400, "Unknown column");
+            if (c->editor.empty()) throw ApiError(400, "The column is read-only");
+            Variant typed;
+            try {
+                typed = fromJson(value, c->editor);
+            } catch (const pelta::Error& e) {
+                throw ApiError(400, e.description());
+            }
+            return json{{"ok", screen->editCell(grid.name, row, column, typed)}};
+        }));
+    }
+    if (action == "group") {
+        std::string gridName = stringField(body, "grid", false);
+        std::string value = stringField(body, "value", true);
+        return ok(s.ui().call([&] {
+            auto screen = needScreen();
+            GridInfo grid = findGrid(*screen, gridName);
+            if (std::find(grid.groups.begin(), grid.groups.end(), value) == grid.groups.end())
+                throw ApiError(400, "Unknown group");
+            screen->setGroup(grid.name, value);
+            return json{{"ok", true}};
+        }));
+    }
     if (action == "execute") {
         auto command = static_cast<int32_t>(integerField(body, "command", 1, 65535));
         CommandTarget target;

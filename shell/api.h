@@ -1,7 +1,7 @@
 // The page's JSON interface, independent of the HTTP server that carries it.
 //
 //   GET    /api/info                           program, library and database
-//   POST   /api/session        {password?}     a new session (the page's own)
+//   POST   /api/session        {user?, password?}  a new session (the page's own)
 //   DELETE /api/session                        ends the session
 //   POST   /api/session/close                  the same, for a closing tab's beacon
 //   GET    /api/navigation                     the library's public lists
@@ -12,6 +12,9 @@
 //   POST   /api/screens/N/execute {command, grid?, current?, selected?}
 //   POST   /api/screens/N/values  {control, value}
 //   POST   /api/screens/N/save
+//   POST   /api/screens/N/addrow {grid}           a new row in an editable grid
+//   POST   /api/screens/N/cells  {grid, row, column, value}  a cell typed
+//   POST   /api/screens/N/group  {grid, value}    the group a grouped grid shows
 //   DELETE /api/screens/N      ?force=1        closes the screen
 //   POST   /api/dialog/N       {button, value?} answers a waiting dialog
 //
@@ -20,6 +23,7 @@
 // answer {"error": {"status", "message", ...}} with a 4xx or 5xx status.
 #pragma once
 
+#include <functional>
 #include <map>
 #include <memory>
 #include <string>
@@ -46,6 +50,9 @@ struct ApiResponse {
 struct ApiOptions {
     bool requireLogin = false;
     std::string password;  // required of new sessions when requireLogin
+    // Whether a login name is a known, active user of the service; unset
+    // accepts any name.
+    std::function<bool(const std::string& user)> userExists;
     std::string version;
     std::string library;     // the library file in use
     std::string database;    // the database file in use

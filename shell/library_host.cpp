@@ -38,30 +38,54 @@ void terminateObject(pelta::Object* o) {
     pelta::callByName(o, "Terminate");
 }
 
+// Captions of the lists before they are created (a created list's caption
+// comes from its form extender).
+std::string knownCaption(const std::string& objectName) {
+    static const std::pair<const char*, const char*> kCaptions[] = {
+        {"ctxRatios", "Валутни курсове"},
+        {"ctxItems", "Продукти и материали"},
+        {"ctxItemsReserved", "Запазени количества"},
+        {"ctxLocks", "Работни периоди"},
+    };
+    for (const auto& [name, caption] : kCaptions)
+        if (objectName == name) return caption;
+    return objectName;
+}
+
 class Session final : public LibrarySession {
 public:
-    Session(const std::string& libraryName, const ListScreenFactory& factory, ScreenHost& host)
-        : factory_(factory), host_(host) {
+    Session(const std::string& libraryName, const ListAdapterFactory& factory,
+            const std::vector<NavigationEntry>& lists, ScreenHost& host)
+        : lists_(lists) {
         dispatcher_ = pelta::createObject(libraryName + ".cFormDispatcher");
+        if (factory) adapter_ = factory(host);
     }
 
     std::shared_ptr<Screen> openList(const std::string& id) override {
-        if (!factory_)
-            pelta::raise(pelta::errc::ClassNotAvailable,
-                         "Lists cannot be shown yet: the framework that hosts them is not part "
-                         "of this build",
+        auto entry = std::find_if(lists_.begin(), lists_.end(),
+                                  [&](const NavigationEntry& e) { return e.id == id; });
+        if (entry == lists_.end())
+            pelta::raise(pelta::errc::ClassNotAvailable, "The library offers no list " + id,
                          "pelta.shell");
-        return factory_(pelta::createObject(id), host_);
+        if (!entry->available)
+            pelta::raise(pelta::errc::ClassNotAvailable,
+                         "Списъкът \"" + entry->caption + "\" още не е наличен", "pelta.shell");
+        if (!adapter_)
+            pelta::raise(pelta::errc::ClassNotAvailable,
+                         "Lists cannot be shown: no framework hosts them in this program",
+                         "pelta.shell");
+        return adapter_->openList(pelta::createObject(id));
     }
 
     void terminate() override {
         pelta::ObjectRef d = std::move(dispatcher_);
         terminateObject(d.get());
+        adapter_.reset();  // on this thread, where it was made
     }
 
 private:
-    const ListScreenFactory& factory_;
-    ScreenHost& host_;
+    const std::vector<NavigationEntry>& lists_;
+    std::unique_ptr<ListAdapter> adapter_;
     pelta::ObjectRef dispatcher_;
 };
 
@@ -78,10 +102,21 @@ LibraryHost::LibraryHost(std::string libraryFile, std::string libraryName)
         std::error_code ec;
         if (!startsWithNoCase(e.progId, prefix) || !std::filesystem::equivalent(e.path, file_, ec))
             continue;
-        lists_.push_back(NavigationEntry{e.progId, e.progId.substr(name_.size() + 1), true});
+        std::string object = e.progId.substr(name_.size() + 1);
+        // A list the library cannot make yet is offered, disabled.
+        bool available = true;
+        try {
+            pelta::ObjectRef probe = pelta::createObject(e.progId);
+            available = probe != nullptr;
+        } catch (const pelta::Error&) {
+            available = false;
+        }
+        lists_.push_back(NavigationEntry{e.progId, knownCaption(object), available});
     }
-    std::sort(lists_.begin(), lists_.end(),
-              [](const NavigationEntry& a, const NavigationEntry& b) { return a.id < b.id; });
+    // The lists that open first, each group by identifier.
+    std::sort(lists_.begin(), lists_.end(), [](const NavigationEntry& a, const NavigationEntry& b) {
+        return a.available != b.available ? a.available : a.id < b.id;
+    });
     logLine("library " + file_ + ": " + std::to_string(lists_.size()) + " public lists");
 }
 
@@ -94,7 +129,7 @@ std::vector<NavigationEntry> LibraryHost::navigation() {
 }
 
 std::unique_ptr<LibrarySession> LibraryHost::startSession(ScreenHost& host) {
-    return std::make_unique<Session>(name_, factory_, host);
+    return std::make_unique<Session>(name_, factory_, lists_, host);
 }
 
 }  // namespace pelta::shell

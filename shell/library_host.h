@@ -14,21 +14,27 @@
 
 namespace pelta::shell {
 
-// Turns a created list control into a screen: gives it a client site over the
-// session's business-logic connection, lets the framework fetch and fill it,
-// and answers the shell's questions from its extenders.
-using ListScreenFactory =
-    std::function<std::shared_ptr<Screen>(pelta::ObjectRef control, ScreenHost& host)>;
+// The framework's side of one session, made on the session's user-interface
+// thread and released there: turns a created list control into a screen
+// (gives it a client site over the session's business-logic connection, lets
+// the framework fetch and fill it, and answers the shell's questions from its
+// extenders).
+class ListAdapter {
+public:
+    virtual ~ListAdapter() = default;
+    virtual std::shared_ptr<Screen> openList(pelta::ObjectRef control) = 0;
+};
+using ListAdapterFactory = std::function<std::unique_ptr<ListAdapter>(ScreenHost& host)>;
 
 class LibraryHost : public ScreenProvider {
 public:
     // Registers the library file (DllRegisterServer) and reads its public
     // objects back from the registry. Raises pelta::Error when it cannot.
+    // Lists whose class the library cannot create yet are offered disabled.
     explicit LibraryHost(std::string libraryFile, std::string libraryName = "PeltaNom15");
 
-    // Set once the framework is in the build; until then opening a list
-    // raises an error that says so.
-    void setListScreenFactory(ListScreenFactory factory) { factory_ = std::move(factory); }
+    // Without an adapter opening a list raises an error that says so.
+    void setListAdapter(ListAdapterFactory factory) { factory_ = std::move(factory); }
 
     const std::string& libraryFile() const noexcept { return file_; }
 
@@ -39,7 +45,7 @@ private:
     std::string file_;
     std::string name_;
     std::vector<NavigationEntry> lists_;
-    ListScreenFactory factory_;
+    ListAdapterFactory factory_;
 };
 
 }  // namespace pelta::shell

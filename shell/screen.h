@@ -26,12 +26,20 @@ struct ColumnInfo {
     std::string format;
     std::string editor;  // "", "text", "number", "date", "check", "combo", "selector"
     int32_t width = 0;
+    // Combo columns: the rows offered, as key and shown text.
+    std::vector<std::pair<std::string, std::string>> options;
 };
 
 struct GridInfo {
     std::string name;
     std::vector<ColumnInfo> columns;
     int64_t rowCount = 0;
+    bool editable = false;  // rows may be added and cells edited
+    // A grouped grid: the group values offered (the first shows every group)
+    // and the one shown.
+    std::string groupColumn;
+    std::vector<std::string> groups;
+    std::string group;
 };
 
 struct CommandInfo {
@@ -54,6 +62,7 @@ struct ControlInfo {
     Variant value;
     // Combos: the rows offered, as key and shown text.
     std::vector<std::pair<std::string, std::string>> options;
+    std::string prompt;  // shown in an empty field
 };
 
 struct SortKey {
@@ -104,6 +113,17 @@ public:
     // Validates, uploads and saves; false when refused (a message said why).
     virtual bool save() = 0;
 
+    // Editable grids. The defaults raise: a screen without such grids.
+    // A new row in `grid`; answers its key.
+    virtual std::string addRow(const std::string& grid);
+    // A cell of the row `row` typed by the person; false when the screen
+    // refused it (a message said why).
+    virtual bool editCell(const std::string& grid, const std::string& row,
+                          const std::string& column, const Variant& value);
+    // Grouped grids: shows the group `value` (the first of GridInfo::groups
+    // shows every group).
+    virtual void setGroup(const std::string& grid, const std::string& value);
+
     // The termination protocol: may refuse (unsaved edits the person keeps).
     virtual bool queryTerminate() = 0;
     // Releases everything; the screen is not used afterwards.
@@ -115,6 +135,8 @@ class ScreenHost {
 public:
     virtual ~ScreenHost() = default;
     virtual UserAgent& userAgent() = 0;
+    // The login name of the person; empty when nobody logged in (loopback).
+    virtual std::string userName() const { return {}; }
     // Shows another screen (a detail form opened by a list); answers its id.
     virtual int64_t openScreen(std::shared_ptr<Screen> screen) = 0;
     // Tells the page that a screen's caption, values or commands changed.

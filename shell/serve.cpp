@@ -9,8 +9,12 @@
 #include <iostream>
 #include <thread>
 
+#include "bll/database.h"
+#include "bll/service.h"
 #include "platform/automation/error.h"
+#include "platform/automation/registry.h"
 #include "shell/api.h"
+#include "shell/framework_screens.h"
 #include "shell/http_server.h"
 #include "shell/library_host.h"
 #include "shell/log.h"
@@ -120,7 +124,7 @@ std::string defaultDemoDatabase() {
         base = fs::path(h) / ".local" / "share";
     else
         base = fs::current_path();
-    return (base / "pelta" / "demo.sqlite").string();
+    return (base / "pelta" / "demo.db").string();
 }
 
 int serve(const ServeOptions& o) {
@@ -136,16 +140,35 @@ int serve(const ServeOptions& o) {
         }
     }
 
-    // The database: the one named, else the demo database in the data folder.
+    // The database: the one named, else the demo database in the data folder,
+    // created and filled when missing.
     std::string database = o.database.empty() ? defaultDemoDatabase() : o.database;
-    if (o.database.empty()) {
+    try {
         std::error_code ec;
-        fs::create_directories(fs::path(database).parent_path(), ec);
+        if (o.database.empty() && !fs::exists(database, ec)) {
+            fs::create_directories(fs::path(database).parent_path(), ec);
+            logLine("creating the demo database " + database);
+            pelta::bll::createDemoDatabase(database);
+        }
+        pelta::bll::openDatabase(database);  // brings its schema up to date
+    } catch (const pelta::Error& e) {
+        std::cerr << "pelta: cannot open the database " << database << ": " << e.description()
+                  << "\n";
+        return 1;
     }
     apiOptions.database = database;
-    // TODO(bll): open the service over `database` here, creating and seeding the
-    // demo database when it is missing, and hand its connection to the sessions.
-    logLine("database " + database + " (the business-logic service is not in this build yet)");
+    logLine("database " + database);
+    if (apiOptions.requireLogin) {
+        apiOptions.userExists = [database](const std::string& user) {
+            try {
+                pelta::bll::Connection::open(database,
+                                             user);  // raises for unknown or inactive users
+                return true;
+            } catch (const pelta::Error&) {
+                return false;
+            }
+        };
+    }
 
     // Threads started from here on block the stop signals; the main thread waits for them.
     sigset_t stopSignals;
@@ -155,10 +178,13 @@ int serve(const ServeOptions& o) {
     pthread_sigmask(SIG_BLOCK, &stopSignals, nullptr);
     signal(SIGPIPE, SIG_IGN);  // a closed tab is an ordinary failed write
 
+    // The framework first: the library looks for its services once.
+    FrameworkOptions frameworkOptions;
+    frameworkOptions.database = database;
+    ListAdapterFactory adapter = frameworkListAdapter(frameworkOptions);
     LibraryHost library(o.library);
     apiOptions.library = library.libraryFile();
-    // TODO(framework): library.setListScreenFactory(...) with the framework's
-    // adapter from list controls to screens, once the framework is in the build.
+    library.setListAdapter(std::move(adapter));
 
     SessionOptions sessionOptions;
     sessionOptions.idleTimeout = std::chrono::seconds(o.sessionTimeoutSeconds);
@@ -184,6 +210,14 @@ int serve(const ServeOptions& o) {
     sessions.releaseAll();  // ends every event stream and terminates the screens
     http.stop();
     listener.join();
+    // Every screen terminated released its objects: the library may unload.
+    try {
+        auto canUnload = reinterpret_cast<pelta::HResult (*)()>(
+            pelta::serverEntryPoint(library.libraryFile(), "DllCanUnloadNow"));
+        std::cout << "library objects released: " << (canUnload() == pelta::kOk ? "yes" : "no")
+                  << std::endl;
+    } catch (const pelta::Error&) {
+    }
     return 0;
 }
 

@@ -3,10 +3,16 @@
 //   pelta serve [--db FILE] [--address A] [--port P] [--web DIR]
 //               [--session-timeout SECONDS] [--library FILE]
 //
-// Listens on 127.0.0.1:8080 unless told otherwise. On any address but a
-// loopback one every new session must give the password set in the
-// environment variable PELTA_SHELL_PASSWORD; without it the server refuses to
-// start.
+// Opens the business-logic service over FILE, else over the demo database in
+// the user's data folder, which is created and filled with the demo data when
+// missing (a FILE that is missing is created with the schema only).
+//
+// Listens on 127.0.0.1:8080 unless told otherwise; every session then works
+// as the user "admin". On any address but a loopback one every new session
+// must log in: a user name of an active user of the service's users table and
+// the password set in the environment variable PELTA_SHELL_PASSWORD (the
+// users table keeps no passwords yet); without that variable the server
+// refuses to start.
 #pragma once
 
 #include <optional>
@@ -33,7 +39,7 @@ std::optional<ServeOptions> parseServeOptions(const std::vector<std::string>& ar
 // True for 127.0.0.0/8, ::1 and "localhost".
 bool isLoopback(const std::string& address);
 
-// $XDG_DATA_HOME/pelta/demo.sqlite, else ~/.local/share/pelta/demo.sqlite.
+// $XDG_DATA_HOME/pelta/demo.db, else ~/.local/share/pelta/demo.db.
 std::string defaultDemoDatabase();
 
 // Serves until SIGINT or SIGTERM; answers the exit code.

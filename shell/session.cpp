@@ -46,8 +46,9 @@ std::string newSessionId() {
 
 // ---- Session ------------------------------------------------------------------
 
-Session::Session(std::string id, ScreenProvider& provider)
+Session::Session(std::string id, ScreenProvider& provider, std::string user)
     : id_(std::move(id)),
+      user_(std::move(user)),
       provider_(provider),
       dialogs_(events_),
       lastActivity_(ticks(Clock::now())) {
@@ -144,8 +145,13 @@ void Session::publishScreen(int64_t id, const char* change) {
 
 void Session::terminateAll() {
     // Last opened first, as the host terminates its forms.
-    while (!screens_.empty())
+    size_t screens = 0;
+    while (!screens_.empty()) {
         closeScreen(screens_.back().first, true);
+        ++screens;
+    }
+    logLine("session " + id_.substr(0, 8) + " released: " + std::to_string(screens) +
+            " screens terminated");
     if (library_) {
         try {
             library_->terminate();
@@ -188,13 +194,13 @@ SessionManager::~SessionManager() {
     releaseAll();
 }
 
-std::shared_ptr<Session> SessionManager::create() {
+std::shared_ptr<Session> SessionManager::create(const std::string& user) {
     {
         std::lock_guard lock(mutex_);
         if (stopping_ || sessions_.size() >= options_.maxSessions) return nullptr;
     }
     // Started outside the lock: the library's start runs on the new thread.
-    auto session = std::make_shared<Session>(newSessionId(), provider_);
+    auto session = std::make_shared<Session>(newSessionId(), provider_, user);
     std::lock_guard lock(mutex_);
     if (stopping_ || sessions_.size() >= options_.maxSessions) return nullptr;  // releases it
     sessions_.emplace(session->id(), session);

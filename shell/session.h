@@ -27,7 +27,8 @@ using Clock = std::chrono::steady_clock;
 
 class Session : public ScreenHost {
 public:
-    Session(std::string id, ScreenProvider& provider);
+    // `user`: the login name of the person (empty on loopback without login).
+    Session(std::string id, ScreenProvider& provider, std::string user = {});
     ~Session() override;
 
     const std::string& id() const noexcept { return id_; }
@@ -45,6 +46,7 @@ public:
 
     // ScreenHost
     UserAgent& userAgent() override { return dialogs_; }
+    std::string userName() const override { return user_; }
     int64_t openScreen(std::shared_ptr<Screen> screen) override;
     void screenChanged(Screen& screen) override;
     void gridChanged(Screen& screen, const std::string& grid) override;
@@ -66,6 +68,7 @@ private:
     void publishScreen(int64_t id, const char* change);
 
     std::string id_;
+    std::string user_;
     ScreenProvider& provider_;
     EventChannel events_;
     DialogBroker dialogs_;
@@ -95,8 +98,8 @@ public:
     SessionManager(const SessionManager&) = delete;
     SessionManager& operator=(const SessionManager&) = delete;
 
-    // A new session; null when the limit is reached.
-    std::shared_ptr<Session> create();
+    // A new session of `user`; null when the limit is reached.
+    std::shared_ptr<Session> create(const std::string& user = {});
     // The live session with this id, marked active; null when there is none.
     std::shared_ptr<Session> find(const std::string& id);
     bool release(const std::string& id);

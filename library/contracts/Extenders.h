@@ -179,6 +179,14 @@ public:
     virtual std::string GridName() = 0;
     virtual void DeclareColumns(const std::vector<ColumnDecl>& Columns) = 0;
     virtual std::vector<ColumnDecl> Columns() = 0;
+    // Rows a combo column offers: the key field, the shown field and further
+    // columns (as IFormExtender::SetControlList for a control). A grid that
+    // draws no lists may ignore it.
+    virtual void SetColumnList(const std::string& Column, RecordsetRef Rows,
+                               const std::string& KeyField,
+                               const std::vector<std::string>& ShownFields) {
+        (void)Column, (void)Rows, (void)KeyField, (void)ShownFields;
+    }
 
     // Binds rows, optionally grouped by a column with an initial group value
     // ("(Всички)" shows every group).

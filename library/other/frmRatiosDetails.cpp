@@ -68,9 +68,8 @@ bool IsBlank(const pelta::Variant& v) {
     return v.isEmpty() || v.isNull() || (v.isString() && v.str().empty());
 }
 
-const ClassCreator s_oReplaced = RegisterFormClass("frmRatiosDetails", [] {
-    return pelta::ObjectRef(pelta::makeRef<frmRatiosDetails>());
-});
+const ClassCreator s_oReplaced = RegisterFormClass(
+    "frmRatiosDetails", [] { return pelta::ObjectRef(pelta::makeRef<frmRatiosDetails>()); });
 
 }  // namespace
 
@@ -96,7 +95,10 @@ bool frmRatiosDetails::pvInitForm() {
 
 void frmRatiosDetails::pvTakeResponse(pelta::PropertyBag& Response, bool) {
     m_rsRows = RecordsetProperty(&Response, "Rows");
-    if (auto currencies = RecordsetProperty(&Response, "Currencies")) m_rsCurrencies = currencies;
+    if (auto currencies = RecordsetProperty(&Response, "Currencies")) {
+        m_rsCurrencies = currencies;
+        m_oGridExt->SetColumnList("Currency_ID", m_rsCurrencies, "ID", {"Code", "Name"});
+    }
     if (auto banks = RecordsetProperty(&Response, "Banks")) {
         m_rsBanks = banks;
         m_oForm->SetControlList("cboBank", m_rsBanks, "ID", {"Name", "Description", "GroupName"});
@@ -111,7 +113,9 @@ void frmRatiosDetails::pvFillControls() {
     if (m_rsRows) m_oGridExt->Bind(m_rsRows);
 }
 
-bool frmRatiosDetails::pvIsModified() { return m_oGridExt->EditState(); }
+bool frmRatiosDetails::pvIsModified() {
+    return m_oGridExt->EditState();
+}
 
 bool frmRatiosDetails::pvIsCorrect() {
     if (IsBlank(m_oForm->ControlValue("cboBank"))) {
@@ -136,7 +140,8 @@ void frmRatiosDetails::pvUpload() {
 
 void frmRatiosDetails::pvWriteSaveRequest(pelta::PropertyBag& Request) {
     Request.writeProperty("Rows", pelta::Variant(pelta::ObjectRef(m_rsRows)));
-    if (m_rsCurrencies) Request.writeProperty("Currencies", pelta::Variant(pelta::ObjectRef(m_rsCurrencies)));
+    if (m_rsCurrencies)
+        Request.writeProperty("Currencies", pelta::Variant(pelta::ObjectRef(m_rsCurrencies)));
 }
 
 bool frmRatiosDetails::pvShowRowError(pelta::PropertyBag&, const std::string& RowID) {

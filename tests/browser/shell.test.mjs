@@ -4,25 +4,15 @@
 //   node --test tests/browser/shell.test.mjs
 //
 // Two servers are driven:
-//  * `pelta serve` on a temporary database: the page, the library's lists as
-//    navigation and the error a list shows while it cannot be opened;
+//  * `pelta serve` on a demo database it creates in a temporary data folder:
+//    the library's lists as navigation (those the library cannot make yet
+//    say so), the currency-rate list and its detail form over the real
+//    framework and service — a rate entered, saved and found in the list,
+//    Yes/No questions answered, and a closed tab's screens terminated;
 //  * the shell over its fixture screens (shell_fixture_server): a list of a
 //    million rows paged from the server, sorting, shortcuts, a detail form
 //    with its validation message, questions and input boxes as modal dialogs,
 //    and the release of a closed tab's session.
-//
-// TODO(ctxRatios): once the framework, the service and the currency-rate
-// screens are in the build, drive `pelta serve` through the rate scenario:
-//   1. open the page; click "ctxRatios" (caption "Валутни курсове") in the navigation;
-//   2. the grid shows the demo database's rates; press Ctrl+N (command 101);
-//   3. in frmRatiosDetails pick a bank in the "Изберете банка" drop-down, set
-//      the date, enter a unit and a rate in a currency row;
-//   4. press Ctrl+S; the form saves (UpdNomCurrRatiosDetails) and the list
-//      refreshes; the new rate's row is in the grid;
-//   5. select an inactive rate, press Del (command 205): the question
-//      "Желаете ли да изтриете избраните неактивни номенклатури?" shows with
-//      Yes/No; answer "Не" and see the row stay, then "Да" and see it go;
-//   6. take a screenshot.
 import { after, before, describe, test } from 'node:test';
 import assert from 'node:assert/strict';
 import { spawn } from 'node:child_process';
@@ -103,13 +93,16 @@ async function answerDialog(page, expectedText, buttonText) {
 }
 
 describe('pelta serve', () => {
-  let work, server, browser;
+  let work, server, browser, page;
   before(async () => {
     work = mkdtempSync(path.join(tmpdir(), 'pelta-serve-'));
-    server = await startServer(path.join(buildDir, 'bin/pelta'),
-      ['serve', '--port', '0', '--db', path.join(work, 'demo.sqlite'), '--web', webDir],
-      { PELTA_REGISTRY: path.join(work, 'registry.ini'), XDG_DATA_HOME: work });
+    // No --db: the demo database is made in the data folder.
+    server = await startServer(path.join(buildDir, 'bin/pelta'), ['serve', '--port', '0', '--web', webDir],
+      { PELTA_REGISTRY: path.join(work, 'registry.ini'), XDG_DATA_HOME: work, PELTA_LOG_FOLDER: path.join(work, 'logs') });
     browser = await launchBrowser();
+    page = await browser.context.newPage();
+    await page.goto(server.url);
+    await page.locator('body[data-ready=true]').waitFor();
   });
   after(async () => {
     await browser?.close();
@@ -117,18 +110,89 @@ describe('pelta serve', () => {
     rmSync(work, { recursive: true, force: true });
   });
 
-  test('the page offers the library\'s public lists', async () => {
-    const page = await browser.context.newPage();
-    await page.goto(server.url);
-    await page.locator('body[data-ready=true]').waitFor();
-    const lists = await page.locator('#lists a').allTextContents();
-    for (const name of ['ctxItems', 'ctxContragents', 'ctxRatios', 'ctxPriceLists'])
-      assert.ok(lists.includes(name), `${name} in ${lists}`);
-    // Until the framework is in the build a list cannot open, and the page says why.
+  const list = () => page.locator('section.screen[data-kind=list]');
+  const form = () => page.locator('section.screen[data-kind=detail]');
+  const footer = (n) => list().locator('.footer', { hasText: new RegExp(`Записи: ${n}$`) });
+
+  test('the navigation offers the library\'s lists; one not made yet says so', async () => {
+    const ratios = page.locator('#lists a[data-list="PeltaNom15.ctxRatios"]');
+    assert.equal(await ratios.textContent(), 'Валутни курсове');
+    assert.ok(!(await ratios.getAttribute('class'))?.includes('unavailable'));
+    const items = page.locator('#lists a[data-list="PeltaNom15.ctxItems"]');
+    assert.equal(await items.textContent(), 'Продукти и материали');
+    assert.ok((await items.getAttribute('class')).includes('unavailable'));
+    await items.click();
+    await answerDialog(page, 'още не е наличен', 'OK');
+  });
+
+  test('the currency-rate list shows the demo rates, grouped by bank', async () => {
     await page.locator('#lists a[data-list="PeltaNom15.ctxRatios"]').click();
-    await answerDialog(page, 'framework', 'OK');
-    await page.screenshot({ path: path.join(shotDir, 'pelta-serve.png') });
-    await page.close();
+    await list().locator('.ag-row', { hasText: 'БНБ' }).first().waitFor();
+    await footer(90).waitFor();
+    assert.equal(await page.locator('.tab.active').textContent(), 'Валутни курсове');
+    // The group filter is applied on the server.
+    await list().locator('select[name=group]').selectOption('БНБ');
+    await footer(30).waitFor();
+    await list().locator('select[name=group]').selectOption('(Всички)');
+    await footer(90).waitFor();
+  });
+
+  test('a new rate is entered in the detail form, saved and shown in the list', async () => {
+    await list().locator('.ag-row').first().click();
+    await page.keyboard.press('Control+n');
+    await form().waitFor();
+    const bank = form().locator('[data-control=cboBank]');
+    assert.equal(await bank.locator('option').first().textContent(), 'Изберете банка');
+    await bank.selectOption({ label: 'БНБ – Българска народна банка' });
+    await form().locator('[data-control=dtpDate]').fill('2031-05-04');
+    await form().locator('button[data-action=addrow]').click();
+    const row = form().locator('.rows-table tbody tr').last();
+    await row.locator('select[name=Currency_ID]').selectOption({ label: 'USD – Щатски долар' });
+    await row.locator('input[name=Units]').fill('1');
+    await row.locator('input[name=Rate]').fill('1.812345');
+    await page.keyboard.press('Control+s');
+    await page.locator('#status', { hasText: 'Записано' }).waitFor();
+    // The saved record comes back: its row now shows the currency's code.
+    await form().locator('.rows-table td[data-column=CurrencyCode]', { hasText: 'USD' }).waitFor();
+    await page.screenshot({ path: path.join(shotDir, 'pelta-rate-form.png') });
+
+    await page.locator('.tab', { hasText: 'Валутни курсове' }).first().click();
+    await footer(91).waitFor();
+    // Sorted on the server by date, newest first, the new rate heads the list.
+    const date = list().locator('.ag-header-cell', { hasText: 'Дата' });
+    await date.click(); // ascending
+    await date.click(); // descending
+    await list().locator('.ag-row[row-index="0"]', { hasText: '04.05.2031' }).waitFor();
+    await page.screenshot({ path: path.join(shotDir, 'pelta-rates.png') });
+  });
+
+  test('Del asks whether to delete the inactive rates; "Не" keeps them', async () => {
+    await list().locator('.ag-row[row-index="0"]').click();
+    await page.keyboard.press('Delete');
+    await answerDialog(page, 'Желаете ли да изтриете избраните неактивни номенклатури?', 'Не');
+    await footer(91).waitFor();
+  });
+
+  test('deleting from the form asks, deletes and closes the form', async () => {
+    await page.locator('.tab', { hasText: 'Валутни курсове' }).last().click();
+    await form().locator('button[data-command="118"]').click();
+    await answerDialog(page, 'Желаете ли да изтриете номенклатурата?', 'Да');
+    await form().waitFor({ state: 'detached' });
+    await footer(90).waitFor();
+  });
+
+  test('a closed tab releases its session and terminates its screens', async () => {
+    await page.close({ runBeforeUnload: true });
+    await assert.doesNotReject(async () => {
+      for (let i = 0; i < 200 && !/released: \d+ screens terminated/.test(server.errors()); i++)
+        await new Promise((r) => setTimeout(r, 50));
+    });
+    const m = server.errors().match(/released: (\d+) screens terminated/);
+    assert.ok(m, server.errors());
+    assert.equal(Number(m[1]), 1); // the list; its detail form had closed
+    const output = await stopServer(server);
+    server = null;
+    assert.match(output, /library objects released: yes/);
   });
 });
 

@@ -4,12 +4,15 @@
 
 #include <filesystem>
 #include <fstream>
+#include <optional>
 #include <thread>
 
 #include "framework/extenders.h"
 #include "framework/form_extender.h"
+#include "framework/grid_extender.h"
 #include "framework/services.h"
 #include "framework/user_agent.h"
+#include "platform/data/recordset.h"
 #include "test_screens.h"
 
 namespace {
@@ -408,6 +411,79 @@ TEST_F(Services, SmallerExtendersRaiseTheirEvents) {
     EXPECT_EQ(order, (std::vector<std::string>{"Filter", "Fetch", "ReportStart", "FillControls"}));
     report->Events().Fetch = [](int32_t, bool& cancel) { cancel = true; };
     EXPECT_FALSE(pelta::query<pelta::fw::ReportExtender>(report.get())->run());
+}
+
+}  // namespace
+
+namespace {
+
+// Tells which documents were shown, as the web shell's agent does.
+class ShowingAgent final : public pelta::fw::UserAgent {
+public:
+    int32_t messageBox(const pelta::fw::Prompt&) override { return vbOK; }
+    void anchoredMessage(const pelta::fw::Prompt&) override {}
+    std::optional<pelta::Variant> inputBox(const pelta::fw::Prompt&) override {
+        return std::nullopt;
+    }
+    void documentShown(FormExtender& form) override { shown.push_back(&form); }
+    std::vector<FormExtender*> shown;
+};
+
+TEST_F(Services, AShownDocumentIsToldToTheAgentUnlessItsFetchIsCancelled) {
+    auto form = makeForm("frmDetails");
+    auto agent = pelta::makeRef<ShowingAgent>();
+    pelta::fw::UserAgentScope scope(agent);
+    bool cancel = false;
+    form->Events().Fetch = [&](int32_t, bool& Cancel) { Cancel = cancel; };
+    EXPECT_TRUE(form->ShowDocument("{1}"));
+    ASSERT_EQ(agent->shown.size(), 1u);
+    EXPECT_EQ(agent->shown[0], form.get());
+    cancel = true;
+    EXPECT_FALSE(form->ShowDocument("{2}"));
+    EXPECT_EQ(agent->shown.size(), 1u);
+}
+
+TEST_F(Services, GridsAreFoundByOwnerOnTheThreadThatMadeThem) {
+    auto owner = pelta::makeRef<pelta::fw::ClientSite>(nullptr);
+    auto other = pelta::makeRef<pelta::fw::ClientSite>(nullptr);
+    auto make = [](pelta::Object* o, const std::string& name) {
+        auto g = pelta::queryRef<pelta::fw::GridExtender>(pelta::createObject(kProgIdGridExtender));
+        g->Init(o, name, 0, {});
+        return g;
+    };
+    auto first = make(owner.get(), "geRows");
+    auto second = make(owner.get(), "geAttribs");
+    auto foreign = make(other.get(), "geCtl");
+    auto grids = pelta::fw::services()->gridsOfOwner(owner.get());
+    ASSERT_EQ(grids.size(), 2u);
+    EXPECT_EQ(grids[0], first.get());
+    EXPECT_EQ(grids[1], second.get());
+    // Another thread's host sees none of them.
+    size_t seen = 99;
+    std::thread([&] { seen = pelta::fw::services()->gridsOfOwner(owner.get()).size(); }).join();
+    EXPECT_EQ(seen, 0u);
+    second.reset();
+    EXPECT_EQ(pelta::fw::services()->gridsOfOwner(owner.get()).size(), 1u) << "gone when released";
+}
+
+TEST_F(Services, AComboColumnKeepsTheRowsItOffers) {
+    auto g = pelta::queryRef<pelta::fw::GridExtender>(pelta::createObject(kProgIdGridExtender));
+    g->Init(nullptr, "geRows", 0, {});
+    PeltaNom15::ColumnDecl c;
+    c.Key = c.Field = "Currency_ID";
+    c.Editor = PeltaNom15::EditorKind::Combo;
+    g->DeclareColumns({c});
+    auto rows = pelta::makeRef<pelta::Recordset>();
+    rows->appendField("ID", pelta::FieldType::Text);
+    rows->appendField("Code", pelta::FieldType::Text);
+    rows->open();
+    EXPECT_THROW(g->SetColumnList("Nope", rows, "ID", {"Code"}), pelta::Error);
+    EXPECT_THROW(g->SetColumnList("currency_id", rows, "ID", {"Name"}), pelta::Error);
+    g->SetColumnList("currency_id", rows, "ID", {"Code"});
+    ASSERT_NE(g->columnList("Currency_ID"), nullptr);
+    EXPECT_EQ(g->columnList("Currency_ID")->shownFields, std::vector<std::string>{"Code"});
+    g->SetColumnList("Currency_ID", nullptr, {}, {});
+    EXPECT_EQ(g->columnList("Currency_ID"), nullptr);
 }
 
 }  // namespace

@@ -123,14 +123,20 @@ TEST_F(ApiTest, ALoginIsAskedWhenTheServerRequiresOne) {
     ApiOptions o;
     o.requireLogin = true;
     o.password = "дълга парола";
+    o.userExists = [](const std::string& user) { return user == "admin"; };
     Api guarded(sessions, o);
-    EXPECT_EQ(guarded.handle({"POST", "/api/session", {}, "{}", {}}).status, 401);
-    EXPECT_EQ(guarded.handle({"POST", "/api/session", {}, R"({"password":"дълга"})", {}}).status,
-              401);
-    ApiResponse r =
-        guarded.handle({"POST", "/api/session", {}, R"({"password":"дълга парола"})", {}});
+    auto login = [&](const std::string& body) {
+        return guarded.handle({"POST", "/api/session", {}, body, {}});
+    };
+    EXPECT_EQ(login("{}").status, 401);
+    EXPECT_EQ(login(R"({"user":"admin","password":"дълга"})").status, 401);
+    EXPECT_EQ(login(R"({"password":"дълга парола"})").status, 401) << "a user is required";
+    EXPECT_EQ(login(R"({"user":"nobody","password":"дълга парола"})").status, 401);
+    EXPECT_EQ(login(R"({"user":5,"password":"дълга парола"})").status, 400);
+    ApiResponse r = login(R"({"user":"admin","password":"дълга парола"})");
     ASSERT_EQ(r.status, 201);
     std::string id = json::parse(r.body)["session"];
+    EXPECT_EQ(sessions.find(id)->userName(), "admin");
     EXPECT_EQ(guarded.handle({"GET", "/api/navigation", {}, "", id}).status, 200);
     EXPECT_EQ(json::parse(guarded.handle({"GET", "/api/info", {}, "", {}}).body)["login"], true);
 }

@@ -14,9 +14,9 @@ export class Connection {
     this.events = null;
   }
 
-  // Starts this tab's own session; `password` only when the server asks for a login.
-  async start(password) {
-    const body = password === undefined ? {} : { password };
+  // Starts this tab's own session; `user` and `password` only when the server asks for a login.
+  async start(user, password) {
+    const body = password === undefined ? {} : { user, password };
     const reply = await this.request('POST', '/api/session', body, false);
     this.session = reply.session;
     return reply;

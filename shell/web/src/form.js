@@ -20,7 +20,7 @@ function inputFor(control) {
       el = document.createElement('select');
       const empty = document.createElement('option');
       empty.value = '';
-      empty.textContent = control.hint || '';
+      empty.textContent = control.prompt || '';
       el.append(empty);
       for (const o of control.options) {
         const opt = document.createElement('option');
@@ -47,7 +47,8 @@ function inputFor(control) {
       if (control.kind === 'number') el.inputMode = 'decimal';
       el.value = control.value === null || control.value === undefined ? '' : String(control.value);
   }
-  if (control.hint && 'placeholder' in el) el.placeholder = control.hint;
+  const placeholder = control.prompt || control.hint;
+  if (placeholder && 'placeholder' in el) el.placeholder = placeholder;
   el.disabled = control.readOnly;
   return el;
 }
@@ -86,6 +87,12 @@ export function renderForm(element, screen, send) {
       input.name = c.name;
       input.addEventListener('change', () => send(c, valueOf(input, c)));
       row.append(caption, input);
+      if (c.hint && c.prompt) {
+        const hint = document.createElement('small');
+        hint.className = 'hint';
+        hint.textContent = c.hint;
+        row.append(hint);
+      }
       fieldset.append(row);
     }
     element.append(fieldset);

@@ -7,17 +7,23 @@ ModuleRegistry.registerModules([AllCommunityModule]);
 
 const BLOCK = 100;
 
+const ISO_DATE = /^(\d{4})-(\d{2})-(\d{2})(?:T(\d{2}:\d{2}:\d{2}))?$/;
+
+// Dates as dd.mm.yyyy, check marks as ✔, combo keys as the text offered.
 function cellFormatter(column) {
-  if (column.editor === 'check') return (p) => (p.value === true ? '✔' : p.value === false ? '' : p.value ?? '');
-  if (column.editor === 'date') {
-    return (p) => {
-      if (typeof p.value !== 'string') return p.value ?? '';
-      const [date, time] = p.value.split('T');
-      const [y, m, d] = date.split('-');
-      return `${d}.${m}.${y}${time ? ' ' + time : ''}`;
-    };
-  }
-  return (p) => (p.value === null || p.value === undefined ? '' : String(p.value));
+  const options = new Map((column.options ?? []).map((o) => [o.key, o.text]));
+  return (p) => {
+    const v = p.value;
+    if (v === null || v === undefined) return '';
+    if (v === true) return '✔';
+    if (v === false) return '';
+    if (options.has(v)) return options.get(v);
+    if (typeof v === 'string') {
+      const m = v.match(ISO_DATE);
+      if (m) return `${m[3]}.${m[2]}.${m[1]}${m[4] ? ' ' + m[4] : ''}`;
+    }
+    return String(v);
+  };
 }
 
 export class ListGrid {

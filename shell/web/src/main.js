@@ -6,11 +6,25 @@ import { ApiError, Connection } from './api.js';
 import { Dialogs } from './dialogs.js';
 import { renderForm } from './form.js';
 import { ListGrid } from './grid.js';
+import { RowsTable } from './rows.js';
 
 const connection = new Connection();
 const dialogs = new Dialogs(document.getElementById('dialog'), connection);
 const screens = new Map(); // id -> { description, tab, view, grids: [ListGrid] }
 let active = null;
+const writes = new Set(); // changes on their way to the server
+
+// A change sent to the server; commands and saves wait for every one of them.
+function track(promise) {
+  writes.add(promise);
+  promise.finally(() => writes.delete(promise));
+  return promise;
+}
+
+async function settled() {
+  if (document.activeElement instanceof HTMLElement) document.activeElement.blur();
+  await Promise.allSettled([...writes]);
+}
 
 const $ = (id) => document.getElementById(id);
 
@@ -63,6 +77,7 @@ document.addEventListener('keydown', (e) => {
 // ---- screens -------------------------------------------------------------------
 
 async function execute(screen, command) {
+  await settled();
   const grid = screen.grids[0];
   const body = { command };
   if (grid) {
@@ -79,7 +94,7 @@ async function execute(screen, command) {
 
 async function save(screen) {
   // A field being edited sends its change first.
-  if (document.activeElement instanceof HTMLElement) document.activeElement.blur();
+  await settled();
   try {
     const reply = await connection.post(`/api/screens/${screen.description.id}/save`);
     status(reply.saved ? 'Записано' : 'Не е записано');
@@ -136,16 +151,17 @@ function render(screen) {
     const form = document.createElement('form');
     form.className = 'detail';
     form.addEventListener('submit', (e) => e.preventDefault());
-    renderForm(form, d, async (control, value) => {
-      try {
-        await connection.post(`/api/screens/${d.id}/values`, { control: control.name, value });
-      } catch (e) {
-        reportError(e);
-      }
-    });
+    renderForm(form, d, (control, value) =>
+      track(
+        connection
+          .post(`/api/screens/${d.id}/values`, { control: control.name, value })
+          .catch(reportError),
+      ),
+    );
     screen.view.append(form);
   }
   for (const g of d.grids) {
+    if (g.groups && g.groups.length > 1) screen.view.append(groupFilter(screen, g));
     const holder = document.createElement('div');
     holder.className = 'grid';
     holder.dataset.grid = g.name;
@@ -153,16 +169,43 @@ function render(screen) {
     const footer = document.createElement('div');
     footer.className = 'footer';
     screen.view.append(footer);
-    const grid = new ListGrid(holder, connection, d, g, {
+    const callbacks = {
       onOpen: () => {
         const open = d.commands.find((c) => c.id === 102 && c.enabled);
         if (open) execute(screen, 102);
       },
       onTotal: (total) => (footer.textContent = `Записи: ${total.toLocaleString('bg-BG')}`),
       onError: reportError,
-    });
+      onWrite: track,
+    };
+    const grid =
+      d.kind === 'detail' && g.editable
+        ? new RowsTable(holder, connection, d, g, callbacks)
+        : new ListGrid(holder, connection, d, g, callbacks);
     screen.grids.push(grid);
   }
+}
+
+// The groups of a grouped list ("(Всички)" first); the server filters.
+function groupFilter(screen, g) {
+  const label = document.createElement('label');
+  label.className = 'group-filter';
+  const column = g.columns.find((c) => c.key === g.groupColumn);
+  label.append(`${column ? column.caption : g.groupColumn}: `);
+  const select = document.createElement('select');
+  select.name = 'group';
+  for (const value of g.groups) select.append(new Option(value, value));
+  select.value = g.group;
+  select.addEventListener('change', async () => {
+    try {
+      await connection.post(`/api/screens/${screen.description.id}/group`, { grid: g.name, value: select.value });
+      for (const grid of screen.grids) if (grid.name === g.name) grid.refresh();
+    } catch (e) {
+      reportError(e);
+    }
+  });
+  label.append(select);
+  return label;
 }
 
 function activate(id) {
@@ -295,8 +338,8 @@ function listen() {
   connection.events.onopen = () => status('');
 }
 
-async function start(password) {
-  await connection.start(password);
+async function start(user, password) {
+  await connection.start(user, password);
   connection.closeOnExit();
   listen();
   await loadNavigation();
@@ -315,10 +358,11 @@ async function main() {
   $('login-form').addEventListener('submit', async (e) => {
     e.preventDefault();
     try {
-      await start(new FormData(e.target).get('password'));
+      const data = new FormData(e.target);
+      await start(data.get('user'), data.get('password'));
       login.hidden = true;
     } catch (err) {
-      $('login-error').textContent = err.status === 401 ? 'Грешна парола' : err.message;
+      $('login-error').textContent = err.status === 401 ? 'Грешно име или парола' : err.message;
     }
   });
 }

@@ -1,0 +1,28 @@
+#include "shell/screen.h"
+
+#include "platform/automation/error.h"
+
+namespace pelta::shell {
+
+namespace {
+[[noreturn]] void notEditable(const std::string& grid) {
+    pelta::raise(pelta::errc::InvalidProcedureCall, "The grid " + grid + " cannot be edited",
+                 "pelta.shell");
+}
+}  // namespace
+
+std::string Screen::addRow(const std::string& grid) {
+    notEditable(grid);
+}
+
+bool Screen::editCell(const std::string& grid, const std::string&, const std::string&,
+                      const Variant&) {
+    notEditable(grid);
+}
+
+void Screen::setGroup(const std::string& grid, const std::string&) {
+    pelta::raise(pelta::errc::InvalidProcedureCall, "The grid " + grid + " has no groups",
+                 "pelta.shell");
+}
+
+}  // namespace pelta::shell

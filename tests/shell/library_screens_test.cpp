@@ -1,0 +1,312 @@
+// The shell over the real library, framework and service: the currency-rate
+// screens driven through the JSON interface as the page drives them, on a
+// temporary demo database.
+#include <gtest/gtest.h>
+#include <stdlib.h>
+
+#include <algorithm>
+#include <filesystem>
+#include <future>
+
+#include "bll/database.h"
+#include "bll/service.h"
+#include "library/contracts/Constants.h"
+#include "platform/automation/registry.h"
+#include "shell/api.h"
+#include "shell/framework_screens.h"
+#include "shell/library_host.h"
+#include "shell/session.h"
+#include "shell_test_util.h"
+
+namespace pelta::shell {
+namespace {
+
+namespace fs = std::filesystem;
+using json = nlohmann::json;
+using testing::nextEvent;
+
+class LibraryScreensTest : public ::testing::Test {
+protected:
+    void SetUp() override {
+        char tmpl[] = "/tmp/pelta_shell_lib_XXXXXX";
+        dir_ = ::mkdtemp(tmpl);
+        ::setenv("PELTA_REGISTRY", (dir_ / "registry.ini").c_str(), 1);
+        ::setenv("PELTA_LOG_FOLDER", (dir_ / "logs").c_str(), 1);
+        db_ = (dir_ / "demo.db").string();
+        pelta::bll::DemoOptions demo;
+        demo.banks = 2;
+        demo.rateDays = 3;
+        demo.currenciesPerRate = 2;
+        pelta::bll::createDemoDatabase(db_, demo);
+
+        FrameworkOptions fo;
+        fo.database = db_;
+        auto adapter = frameworkListAdapter(fo);  // the framework before the library
+        library_ = std::make_unique<LibraryHost>(PELTA_LIBRARY_FILE);
+        library_->setListAdapter(std::move(adapter));
+        SessionOptions so;
+        so.reapInterval = std::chrono::hours(1);
+        sessions_ = std::make_unique<SessionManager>(*library_, so);
+        api_ = std::make_unique<Api>(*sessions_, ApiOptions{});
+
+        json s = ok("POST", "/api/session", "{}");
+        session_ = s["session"];
+    }
+
+    void TearDown() override {
+        api_.reset();
+        sessions_.reset();
+        library_.reset();
+        ::unsetenv("PELTA_REGISTRY");
+        ::unsetenv("PELTA_LOG_FOLDER");
+        std::error_code ec;
+        fs::remove_all(dir_, ec);
+    }
+
+    ApiResponse call(const std::string& method, const std::string& path,
+                     const std::string& body = {}, std::map<std::string, std::string> query = {}) {
+        return api_->handle(ApiRequest{method, path, std::move(query), body, session_});
+    }
+    json ok(const std::string& method, const std::string& path, const std::string& body = {},
+            std::map<std::string, std::string> query = {}) {
+        ApiResponse r = call(method, path, body, std::move(query));
+        EXPECT_LT(r.status, 300) << method << " " << path << ": " << r.body;
+        return json::parse(r.body);
+    }
+    Session& live() { return *sessions_->find(session_); }
+
+    std::string scalar(const std::string& sql) {
+        auto db = pelta::bll::openDatabase(db_);
+        auto st = db->prepare(sql);
+        return st->step() ? st->value(0).toString() : std::string();
+    }
+    int64_t count(const std::string& sql) { return std::stoll(scalar(sql)); }
+
+    static std::string path(int64_t screen, const std::string& action = {}) {
+        return "/api/screens/" + std::to_string(screen) + (action.empty() ? "" : "/" + action);
+    }
+
+    int64_t openRatios() {
+        json list = ok("POST", "/api/lists", R"({"id":"PeltaNom15.ctxRatios"})");
+        return list["id"];
+    }
+
+    // Runs a request that asks a question, answers it with `button` and
+    // answers the question's text and the request's response.
+    std::pair<std::string, ApiResponse> answering(int32_t button, const std::string& method,
+                                                  const std::string& p, const std::string& body) {
+        uint64_t after = live().events().lastSequence();
+        auto pending = std::async(std::launch::async, [=, this] { return call(method, p, body); });
+        json dialog = nextEvent(live().events(), "dialog", after);
+        json answer = ok("POST", "/api/dialog/" + std::to_string(dialog["id"].get<uint64_t>()),
+                         json{{"button", button}}.dump());
+        EXPECT_EQ(answer["answered"], true);
+        return {dialog["text"], pending.get()};
+    }
+
+    // A new rate through command 101, filled as the page fills it; answers the detail screen.
+    int64_t newRate(int64_t list, const std::string& bank, const std::string& date,
+                    const std::string& currency, const std::string& rate) {
+        uint64_t after = live().events().lastSequence();
+        EXPECT_EQ(ok("POST", path(list, "execute"), R"({"command":101})")["handled"], true);
+        json opened = nextEvent(live().events(), "screen", after);
+        int64_t detail = opened["screen"];
+        ok("POST", path(detail, "values"), json{{"control", "cboBank"}, {"value", bank}}.dump());
+        ok("POST", path(detail, "values"), json{{"control", "dtpDate"}, {"value", date}}.dump());
+        json added = ok("POST", path(detail, "addrow"), R"({"grid":"geRows"})");
+        EXPECT_EQ(added["added"], true);
+        std::string row = added["key"];
+        for (auto [column, value] : {std::pair<std::string, std::string>{"Currency_ID", currency},
+                                     {"Units", "1"},
+                                     {"Rate", rate}}) {
+            json cell =
+                ok("POST", path(detail, "cells"),
+                   json{{"grid", "geRows"}, {"row", row}, {"column", column}, {"value", value}}
+                       .dump());
+            EXPECT_EQ(cell["ok"], true) << column;
+        }
+        return detail;
+    }
+
+    std::string bank() { return scalar("SELECT ID FROM nom_banks ORDER BY Name LIMIT 1"); }
+    std::string currency(const std::string& code) {
+        return scalar("SELECT ID FROM nom_currencies WHERE Code = '" + code + "'");
+    }
+
+    fs::path dir_;
+    std::string db_;
+    std::unique_ptr<LibraryHost> library_;
+    std::unique_ptr<SessionManager> sessions_;
+    std::unique_ptr<Api> api_;
+    std::string session_;
+};
+
+TEST_F(LibraryScreensTest, NavigationOffersTheListsTheLibraryCanMake) {
+    json nav = ok("GET", "/api/navigation");
+    bool ratios = false, items = false;
+    for (const json& e : nav["lists"]) {
+        if (e["id"] == "PeltaNom15.ctxRatios") {
+            ratios = true;
+            EXPECT_EQ(e["caption"], "Валутни курсове");
+            EXPECT_EQ(e["available"], true);
+        }
+        if (e["id"] == "PeltaNom15.ctxItems") {
+            items = true;
+            EXPECT_EQ(e["available"], false);
+        }
+    }
+    EXPECT_TRUE(ratios && items);
+    ApiResponse r = call("POST", "/api/lists", R"({"id":"PeltaNom15.ctxItems"})");
+    EXPECT_EQ(r.status, 422);
+    EXPECT_NE(r.body.find("още не е наличен"), std::string::npos) << r.body;
+}
+
+TEST_F(LibraryScreensTest, TheRatesListShowsItsMenuColumnsAndGroupsAndPagesOnTheServer) {
+    int64_t list = openRatios();
+    json d = ok("GET", path(list));
+    EXPECT_EQ(d["caption"], "Валутни курсове");
+    std::map<int, std::string> shortcuts;
+    for (const json& c : d["commands"])
+        shortcuts[c["id"]] = c["shortcut"];
+    EXPECT_EQ(shortcuts[101], "Ctrl+N");
+    EXPECT_EQ(shortcuts[102], "Ctrl+O");
+    EXPECT_EQ(shortcuts[205], "Del");
+    EXPECT_EQ(shortcuts[207], "F5");
+    EXPECT_FALSE(shortcuts.count(201)) << "the list removes save";
+
+    const json& grid = d["grids"][0];
+    EXPECT_EQ(grid["columns"][0]["caption"], "Дата");
+    EXPECT_EQ(grid["groupColumn"], "PrName");
+    EXPECT_EQ(grid["groups"][0], "(Всички)");
+    const int64_t all = count("SELECT COUNT(*) FROM nom_currratios");
+    EXPECT_EQ(grid["rowCount"], all);
+
+    // Pages in the asked order, from a clone: the grid's own order is untouched.
+    json first = ok("GET", path(list, "rows"), {}, {{"count", "5"}});
+    json byBank = ok("GET", path(list, "rows"), {}, {{"count", "500"}, {"sort", "PrName:desc"}});
+    EXPECT_EQ(byBank["total"], all);
+    ASSERT_EQ(byBank["rows"].size(), static_cast<size_t>(all));
+    // Descending is ascending reversed (texts by Bulgarian collation, on the server).
+    json ascending = ok("GET", path(list, "rows"), {}, {{"count", "500"}, {"sort", "PrName:asc"}});
+    std::vector<std::string> up, down;
+    for (const json& row : ascending["rows"])
+        up.push_back(row["cells"][1]);
+    for (const json& row : byBank["rows"])
+        down.push_back(row["cells"][1]);
+    std::reverse(down.begin(), down.end());
+    EXPECT_EQ(up, down);
+    EXPECT_NE(up.front(), up.back());
+    EXPECT_EQ(ok("GET", path(list, "rows"), {}, {{"count", "5"}})["rows"], first["rows"]);
+    ApiResponse bad = call("GET", path(list, "rows"), {}, {{"sort", "Nope:asc"}});
+    EXPECT_EQ(bad.status, 400);
+
+    // A group filter shows one bank's rates.
+    std::string bankName = grid["groups"][1];
+    ok("POST", path(list, "group"), json{{"grid", "geCtl"}, {"value", bankName}}.dump());
+    json one = ok("GET", path(list, "rows"), {}, {{"count", "500"}});
+    EXPECT_LT(one["total"].get<int64_t>(), all);
+    for (const json& row : one["rows"])
+        EXPECT_EQ(row["cells"][1], bankName);
+    EXPECT_EQ(call("POST", path(list, "group"), R"({"grid":"geCtl","value":"Няма такава"})").status,
+              400);
+}
+
+TEST_F(LibraryScreensTest, ANewRateIsEnteredSavedAndShownInTheList) {
+    int64_t list = openRatios();
+    const int64_t before = count("SELECT COUNT(*) FROM nom_currratios");
+    int64_t detail = newRate(list, bank(), "2031-05-04", currency("USD"), "1.812345");
+
+    json d = ok("GET", path(detail));
+    EXPECT_EQ(d["kind"], "detail");
+    bool offered = false;
+    for (const json& c : d["controls"]) {
+        if (c["name"] != "cboBank") continue;
+        EXPECT_EQ(c["prompt"], "Изберете банка");
+        EXPECT_EQ(c["value"], bank());
+        offered = !c["options"].empty();
+    }
+    EXPECT_TRUE(offered);
+    const json& rowsGrid = d["grids"][0];
+    EXPECT_EQ(rowsGrid["editable"], true);
+    EXPECT_FALSE(rowsGrid["columns"][0]["options"].empty()) << "the currencies are offered";
+
+    EXPECT_EQ(ok("POST", path(detail, "save"), "{}")["saved"], true);
+    EXPECT_EQ(count("SELECT COUNT(*) FROM nom_currratios"), before + 1);
+    EXPECT_EQ(count("SELECT Rate FROM nom_currratiosdetails d JOIN nom_currratios r ON "
+                    "r.ID = d.CurrRatio_ID WHERE r.Date = 47972"),
+              1812345);
+    // The list shows it first when sorted by date, newest first.
+    json top = ok("GET", path(list, "rows"), {}, {{"count", "1"}, {"sort", "Date:desc"}});
+    EXPECT_EQ(top["total"], before + 1);
+    EXPECT_EQ(top["rows"][0]["cells"][0], "2031-05-04");
+}
+
+TEST_F(LibraryScreensTest, SavingWithoutABankIsRefusedWithAMessageAtTheField) {
+    int64_t list = openRatios();
+    int64_t detail = newRate(list, "", "2031-05-04", currency("USD"), "1.8");
+    auto [text, response] = answering(PeltaNom15::vbOK, "POST", path(detail, "save"), "{}");
+    EXPECT_EQ(text, "Моля изберете банка");
+    EXPECT_EQ(json::parse(response.body)["saved"], false);
+}
+
+TEST_F(LibraryScreensTest, DeleteInactiveAsksAndTheAnswerDecides) {
+    int64_t list = openRatios();
+    int64_t detail = newRate(list, bank(), "2031-05-04", currency("USD"), "1.8");
+    ok("POST", path(detail, "values"), R"({"control":"chkIsActive","value":false})");
+    ASSERT_EQ(ok("POST", path(detail, "save"), "{}")["saved"], true);
+    const int64_t before = count("SELECT COUNT(*) FROM nom_currratios");
+
+    json top = ok("GET", path(list, "rows"), {}, {{"count", "1"}, {"sort", "Date:desc"}});
+    std::string key = top["rows"][0]["key"];
+    std::string body = json{{"command", 205}, {"current", key}, {"selected", {key}}}.dump();
+    auto [question, no] = answering(PeltaNom15::vbNo, "POST", path(list, "execute"), body);
+    EXPECT_EQ(question, "Желаете ли да изтриете избраните неактивни номенклатури?");
+    EXPECT_EQ(no.status, 200);
+    EXPECT_EQ(count("SELECT COUNT(*) FROM nom_currratios"), before);
+
+    auto [again, yes] = answering(PeltaNom15::vbYes, "POST", path(list, "execute"), body);
+    EXPECT_EQ(yes.status, 200);
+    EXPECT_EQ(count("SELECT COUNT(*) FROM nom_currratios"), before - 1);
+}
+
+TEST_F(LibraryScreensTest, DeletingFromTheFormClosesItsScreen) {
+    int64_t list = openRatios();
+    int64_t detail = newRate(list, bank(), "2031-05-04", currency("EUR"), "1.95583");
+    ASSERT_EQ(ok("POST", path(detail, "save"), "{}")["saved"], true);
+    const int64_t before = count("SELECT COUNT(*) FROM nom_currratios");
+    auto [question, r] =
+        answering(PeltaNom15::vbYes, "POST", path(detail, "execute"), R"({"command":118})");
+    EXPECT_EQ(question, "Желаете ли да изтриете номенклатурата?");
+    EXPECT_EQ(count("SELECT COUNT(*) FROM nom_currratios"), before - 1);
+    EXPECT_EQ(call("GET", path(detail)).status, 404) << "the detail screen closed";
+    EXPECT_EQ(ok("GET", path(list, "rows"), {}, {{"count", "1"}})["total"], before - 1);
+}
+
+TEST_F(LibraryScreensTest, AClosedSessionTerminatesItsScreensAndReleasesTheLibrarysObjects) {
+    int64_t list = openRatios();
+    newRate(list, bank(), "2031-05-04", currency("USD"), "1.8");  // unsaved
+    ok("POST", "/api/session/close", "{}");
+    auto canUnload = reinterpret_cast<pelta::HResult (*)()>(
+        pelta::serverEntryPoint(PELTA_LIBRARY_FILE, "DllCanUnloadNow"));
+    EXPECT_EQ(canUnload(), pelta::kOk) << "every object of the library was released";
+    EXPECT_EQ(call("GET", path(list)).status, 401);
+}
+
+TEST_F(LibraryScreensTest, ASessionEndingDuringAQuestionUnwindsTheScreen) {
+    int64_t list = openRatios();
+    json top = ok("GET", path(list, "rows"), {}, {{"count", "1"}});
+    std::string key = top["rows"][0]["key"];
+    uint64_t after = live().events().lastSequence();
+    auto pending = std::async(std::launch::async, [&] {
+        return call("POST", path(list, "execute"),
+                    json{{"command", 205}, {"current", key}, {"selected", {key}}}.dump());
+    });
+    nextEvent(live().events(), "dialog", after);
+    const int64_t before = count("SELECT COUNT(*) FROM nom_currratios");
+    sessions_->release(session_);  // the tab went away mid-question
+    EXPECT_LT(pending.get().status, 500);
+    EXPECT_EQ(count("SELECT COUNT(*) FROM nom_currratios"), before) << "answered No";
+}
+
+}  // namespace
+}  // namespace pelta::shell
