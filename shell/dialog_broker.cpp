@@ -1,5 +1,7 @@
 #include "shell/dialog_broker.h"
 
+#include "shell/apartment.h"
+
 #include <algorithm>
 #include <nlohmann/json.hpp>
 
@@ -94,6 +96,8 @@ DialogBroker::DialogBroker(EventChannel& events) : events_(events) {}
 
 DialogAnswer DialogBroker::ask(const DialogRequest& request) {
     Waiting w{0, request, std::nullopt};
+    // Other sessions may run while this one waits for its person.
+    ApartmentRelease letOthersRun;
     std::unique_lock lock(mutex_);
     if (closed_) return DialogAnswer{dismissButton(request.kind, request.style), std::nullopt};
     w.id = nextId_++;

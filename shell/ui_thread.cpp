@@ -1,5 +1,7 @@
 #include "shell/ui_thread.h"
 
+#include "shell/apartment.h"
+
 namespace pelta::shell {
 
 UiThread::UiThread() : thread_([this] { run(); }) {
@@ -49,6 +51,7 @@ void UiThread::run() {
             task = std::move(tasks_.front());
             tasks_.pop_front();
         }
+        ApartmentScope apartment;
         task();
     }
 }

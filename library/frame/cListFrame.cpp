@@ -20,9 +20,13 @@ cListFrame::cListFrame(ListDefinition Def) : m_oDef(std::move(Def)) {
     mdErrorHandling::DebugInstanceInit(m_oDef.ObjectName, m_lInstanceID, this);
 }
 
-cListFrame::~cListFrame() { mdErrorHandling::DebugInstanceTerm(m_oDef.ObjectName, m_lInstanceID); }
+cListFrame::~cListFrame() {
+    mdErrorHandling::DebugInstanceTerm(m_oDef.ObjectName, m_lInstanceID);
+}
 
-RecordsetRef cListFrame::ListRecordset() const { return m_rsList; }
+RecordsetRef cListFrame::ListRecordset() const {
+    return m_rsList;
+}
 
 bool cListFrame::InitClientSite(IClientSite* Site) {
     if (m_oForm) return true;  // initialised once; later calls come from hosts reusing the control
@@ -191,9 +195,9 @@ void cListFrame::pvDeleteInactive() {
     if (m_oForm->MsgBox(kAskDeleteInactive, vbYesNo | vbQuestion) != vbYes) return;
     auto services = FrameworkServices();
     if (!services || !services->RecordDeletion()) return;
-    services->RecordDeletion()->DeleteRecords(m_oConnection.get(), m_oGridExt.get(),
-                                              m_oForm.get(), kBllCallKind,
-                                              m_oDef.DeleteOperation, m_oDef.KeyField, true);
+    services->RecordDeletion()->DeleteRecords(m_oConnection.get(), m_oGridExt.get(), m_oForm.get(),
+                                              kBllCallKind, m_oDef.DeleteOperation, m_oDef.KeyField,
+                                              true);
 }
 
 void cListFrame::pvMergeListRow(const RecordsetRef& Row) {
