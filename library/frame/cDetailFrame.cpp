@@ -25,9 +25,13 @@ cDetailFrame::cDetailFrame(DetailDefinition Def) : m_oDef(std::move(Def)) {
     mdErrorHandling::DebugInstanceInit(m_oDef.ObjectName, m_lInstanceID, this);
 }
 
-cDetailFrame::~cDetailFrame() { mdErrorHandling::DebugInstanceTerm(m_oDef.ObjectName, m_lInstanceID); }
+cDetailFrame::~cDetailFrame() {
+    mdErrorHandling::DebugInstanceTerm(m_oDef.ObjectName, m_lInstanceID);
+}
 
-RecordsetRef cDetailFrame::Head() const { return m_rsHead; }
+RecordsetRef cDetailFrame::Head() const {
+    return m_rsHead;
+}
 
 bool cDetailFrame::frInit(IClientSite* Site) {
     try {
@@ -94,8 +98,8 @@ void cDetailFrame::m_oForm_Fetch(int32_t Step, bool& Cancel) {
         auto request = CreatePropertyBag(m_oForm.get());
         request->writeProperty("ID", pelta::Variant(m_sKey));
         request->writeProperty("Referentials", pelta::Variant(m_oForm->Referentials()));
-        auto response = CallBll(m_oForm.get(), m_oConnection.get(), m_oDef.ReadOperation,
-                                request.get());
+        auto response =
+            CallBll(m_oForm.get(), m_oConnection.get(), m_oDef.ReadOperation, request.get());
         if (!response) {
             Cancel = true;
             return;
@@ -176,7 +180,8 @@ bool cDetailFrame::pvModified() {
         if (c.Field.empty() || c.ReadOnly || m_rsHead->fieldIndex(c.Field) < 0) continue;
         if (!m_oDef.ModifiedFields.empty()) {
             bool listed = false;
-            for (const auto& f : m_oDef.ModifiedFields) listed = listed || f == c.Field;
+            for (const auto& f : m_oDef.ModifiedFields)
+                listed = listed || f == c.Field;
             if (!listed) continue;
         }
         if (!SameValue(m_oForm->ControlValue(c.Name), m_rsHead->value(c.Field))) return true;
@@ -225,25 +230,36 @@ void cDetailFrame::m_oForm_Save(bool& Cancel) {
         request->writeProperty("Head", pelta::Variant(pelta::ObjectRef(m_rsHead)));
         pvWriteSaveRequest(*request);
         request->writeProperty("NeedFetch", pelta::Variant(false));
-        request->writeProperty("NeedList", pelta::Variant(m_oDef.ListName));
-        auto response = CallBll(m_oForm.get(), m_oConnection.get(), m_oDef.UpdateOperation,
-                                request.get());
-        if (!response) {
+        request->writeProperty(
+            "NeedList",
+            pelta::Variant(m_oDef.NeedList.empty() ? m_oDef.ListName : m_oDef.NeedList));
+        // A form may answer a refusal by sending the request again (after the
+        // user agreed to a duplicate); never more often than this.
+        constexpr int32_t kMaxAttempts = 4;
+        PropertyBagRef response;
+        for (int32_t attempt = 1;; ++attempt) {
+            response =
+                CallBll(m_oForm.get(), m_oConnection.get(), m_oDef.UpdateOperation, request.get());
+            if (!response) {
+                Cancel = true;
+                return;
+            }
+            if (response->readProperty("BllError").isEmpty()) break;
+            // Everything the answer carries is read before its verdict; the
+            // form's data is replaced only when the save went through, so
+            // that a refused save leaves the user's edits where they were.
+            SaveRefusal what = pvSaveRefused(*response, *request, attempt);
+            if (what == SaveRefusal::Retry && attempt < kMaxAttempts) continue;
+            if (what != SaveRefusal::Handled) {
+                const std::string rowID = C2Str(response->readProperty("BllRowID"));
+                if (rowID.empty() || !pvShowRowError(*response, rowID))
+                    ShowBllError(m_oForm.get(), response.get());
+            }
             Cancel = true;
             return;
         }
-        // Everything the answer carries is read before its verdict; the
-        // form's data is replaced only when the save went through, so that a
-        // refused save leaves the user's edits where they were.
         auto head = RecordsetProperty(response.get(), "Head");
         auto listRow = RecordsetProperty(response.get(), "ListResult");
-        if (!response->readProperty("BllError").isEmpty()) {
-            const std::string rowID = C2Str(response->readProperty("BllRowID"));
-            if (rowID.empty() || !pvShowRowError(*response, rowID))
-                ShowBllError(m_oForm.get(), response.get());
-            Cancel = true;
-            return;
-        }
         if (!head || head->recordCount() == 0) {
             Cancel = true;
             return;
@@ -270,6 +286,10 @@ void cDetailFrame::m_oForm_QueryStandalone(bool& Cancel) {
 
 void cDetailFrame::m_oForm_BeforeExecute(int32_t CommandID, bool& Handled) {
     try {
+        if (pvExecute(CommandID)) {
+            Handled = true;
+            return;
+        }
         if (CommandID != kCmdDelete) return;
         Handled = true;
         pvDelete();
@@ -284,9 +304,8 @@ void cDetailFrame::pvDelete() {
     if (m_oForm->AskYesNo(kAskDelete) != vbYes) return;
     auto services = FrameworkServices();
     if (!services || !services->RecordDeletion()) return;
-    if (!services->RecordDeletion()->DeleteRecord(m_oConnection.get(), m_oForm.get(),
-                                                  kBllCallKind, m_oDef.DeleteOperation,
-                                                  m_oDef.KeyField, m_sKey))
+    if (!services->RecordDeletion()->DeleteRecord(m_oConnection.get(), m_oForm.get(), kBllCallKind,
+                                                  m_oDef.DeleteOperation, m_oDef.KeyField, m_sKey))
         return;
     if (m_fnRecordDeleted) m_fnRecordDeleted();
     m_sKey.clear();

@@ -20,9 +20,13 @@ cListFrame::cListFrame(ListDefinition Def) : m_oDef(std::move(Def)) {
     mdErrorHandling::DebugInstanceInit(m_oDef.ObjectName, m_lInstanceID, this);
 }
 
-cListFrame::~cListFrame() { mdErrorHandling::DebugInstanceTerm(m_oDef.ObjectName, m_lInstanceID); }
+cListFrame::~cListFrame() {
+    mdErrorHandling::DebugInstanceTerm(m_oDef.ObjectName, m_lInstanceID);
+}
 
-RecordsetRef cListFrame::ListRecordset() const { return m_rsList; }
+RecordsetRef cListFrame::ListRecordset() const {
+    return m_rsList;
+}
 
 bool cListFrame::InitClientSite(IClientSite* Site) {
     if (m_oForm) return true;  // initialised once; later calls come from hosts reusing the control
@@ -98,7 +102,7 @@ void cListFrame::m_oForm_Fetch(int32_t Step, bool& Cancel) {
         // An operation without parameters gets no bytes at all.
         auto response = CallBll(m_oForm.get(), m_oConnection.get(), m_oDef.ReadOperation,
                                 request->count() ? request.get() : nullptr);
-        if (!response) {
+        if (!response || !pvTakeFetchResponse(*response)) {
             Cancel = true;
             return;
         }
@@ -129,6 +133,10 @@ void cListFrame::m_oForm_FillControls() {
 
 void cListFrame::m_oForm_BeforeExecute(int32_t CommandID, bool& Handled) {
     try {
+        if (pvExecute(CommandID)) {
+            Handled = true;
+            return;
+        }
         switch (CommandID) {
             case kCmdNew:
                 Handled = true;
@@ -150,7 +158,6 @@ void cListFrame::m_oForm_BeforeExecute(int32_t CommandID, bool& Handled) {
                 m_oForm->Refresh();
                 break;
             default:
-                Handled = pvExecute(CommandID);
                 break;
         }
     } catch (...) {
@@ -191,9 +198,9 @@ void cListFrame::pvDeleteInactive() {
     if (m_oForm->MsgBox(kAskDeleteInactive, vbYesNo | vbQuestion) != vbYes) return;
     auto services = FrameworkServices();
     if (!services || !services->RecordDeletion()) return;
-    services->RecordDeletion()->DeleteRecords(m_oConnection.get(), m_oGridExt.get(),
-                                              m_oForm.get(), kBllCallKind,
-                                              m_oDef.DeleteOperation, m_oDef.KeyField, true);
+    services->RecordDeletion()->DeleteRecords(m_oConnection.get(), m_oGridExt.get(), m_oForm.get(),
+                                              kBllCallKind, m_oDef.DeleteOperation, m_oDef.KeyField,
+                                              true);
 }
 
 void cListFrame::pvMergeListRow(const RecordsetRef& Row) {
