@@ -5,6 +5,7 @@
 #include <random>
 
 #include "bll/database.h"
+#include "bll/demo_partners.h"
 #include "bll/service.h"
 #include "platform/automation/guid.h"
 
@@ -190,6 +191,7 @@ void generateDemo(Database& db, const DemoOptions& o) {
     put("DefVatPriceScale", "2");
     put("DefItmDimensionName", "Дименсии на продукти");
     put("DefCgDimensionName", "Дименсии на контрагенти");
+    generatePartnersDemo(db, o);
     tx.commit();
 }
 

@@ -125,9 +125,198 @@ CREATE INDEX ix_nom_currratiosdetails_head ON nom_currratiosdetails (CurrRatio_I
 CREATE INDEX ix_nom_currratiosdetails_currency ON nom_currratiosdetails (Currency_ID);
 )sql";
 
+// Version 3 is kept for the items.
+//
+// Business partners with their persons, delivery addresses, bank accounts and
+// departments, the partner types, and the dimensions of partners with their
+// values. Price lists, discount schemes, bonus programmes, countries, cities
+// and streets are referred to by key only (no foreign key), so that the
+// tables that hold them may come in any order.
+constexpr const char* kMigration4 = R"sql(
+INSERT OR IGNORE INTO sys_settings (Name, Kind, Value) VALUES
+    ('CgTypeNaturalPerson_ID', 'Guid', NULL),
+    ('CgTypeEmployee_ID', 'Guid', NULL),
+    ('CgTypeStore_ID', 'Guid', NULL);
+
+CREATE TABLE nom_cgtypes (
+    ID GUID NOT NULL PRIMARY KEY,
+    Code VARCHAR(20) NOT NULL UNIQUE,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    IsDef BOOLEAN DEFAULT 0,
+    IsActive BOOLEAN NOT NULL DEFAULT 1
+);
+
+CREATE TABLE nom_cgdimensions (
+    ID GUID NOT NULL PRIMARY KEY,
+    Code VARCHAR(20) NOT NULL UNIQUE,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    ValueType INTEGER NOT NULL DEFAULT 1 CHECK (ValueType IN (1, 7)),
+    IsRequired BOOLEAN DEFAULT 0,
+    IsActive BOOLEAN NOT NULL DEFAULT 1
+);
+
+CREATE TABLE nom_cgdimvalues (
+    ID GUID NOT NULL PRIMARY KEY,
+    Dimension_ID GUID NOT NULL REFERENCES nom_cgdimensions (ID) ON DELETE CASCADE,
+    Code VARCHAR(20),
+    Name VARCHAR(200) NOT NULL,
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    UNIQUE (Dimension_ID, Name)
+);
+
+CREATE TABLE nom_contragents (
+    ID GUID NOT NULL PRIMARY KEY,
+    Code VARCHAR(20) NOT NULL UNIQUE,
+    Name VARCHAR(200) NOT NULL UNIQUE,
+    Address VARCHAR(255) NOT NULL,
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    TaxNo VARCHAR(20),
+    Bulstat VARCHAR(20),
+    CgType_ID GUID NOT NULL REFERENCES nom_cgtypes (ID),
+    PrsOsp_ID GUID,
+    Note VARCHAR(1000),
+    NoteRtf LONGTEXT,
+    PriceList_ID GUID,
+    Disc_ID GUID,
+    Name2 VARCHAR(200),
+    Phone VARCHAR(100),
+    CreditLimitation DECIMAL(18,8),
+    MaxDaysInArrears INTEGER,
+    GlobalLocationNumber VARCHAR(20),
+    DvskNo VARCHAR(50),
+    Country_ID GUID,
+    City_ID GUID,
+    PostalCode VARCHAR(20),
+    Street_ID GUID,
+    StreetNo VARCHAR(20),
+    BlockNo VARCHAR(20),
+    Entrance VARCHAR(20),
+    FloorNo VARCHAR(20),
+    Apartment VARCHAR(20),
+    Place VARCHAR(255),
+    CorrespAddress VARCHAR(255),
+    CorrespAddress2 VARCHAR(255),
+    Fax VARCHAR(100),
+    Email VARCHAR(255),
+    WebAddress VARCHAR(255),
+    Address2 VARCHAR(255),
+    InvDaysPostponePmt INTEGER,
+    SupDaysPostponePmt INTEGER,
+    CgStoreMode INTEGER DEFAULT 0,
+    SellEqualStoreQuantity BOOLEAN DEFAULT 0,
+    MandatoryValidationRSD BOOLEAN DEFAULT 0,
+    OwnPrsMol_ID GUID,
+    WayOfPayment INTEGER DEFAULT 0,
+    RequiredInvDoc INTEGER DEFAULT 0,
+    InvCgOwn_ID GUID,
+    CgForInvoice_ID GUID,
+    IsDepRequired BOOLEAN DEFAULT 0,
+    IsExcisePrintable BOOLEAN DEFAULT 0,
+    License VARCHAR(100),
+    LicenseMi VARCHAR(100),
+    CcStruct_ID GUID,
+    CcProject_ID GUID,
+    CcOther_ID GUID,
+    CustomPrintSettings BOOLEAN DEFAULT 0,
+    Bonus_ID GUID,
+    DeliveryAddress_ID GUID,
+    PosCards VARCHAR(1000),
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+CREATE INDEX ix_nom_contragents_type ON nom_contragents (CgType_ID);
+CREATE INDEX ix_nom_contragents_bulstat ON nom_contragents (Bulstat);
+CREATE INDEX ix_nom_contragents_taxno ON nom_contragents (TaxNo);
+
+-- A person's code, a department's code and an account's IBAN with its BIC
+-- are unique across all partners.
+CREATE TABLE nom_cgpersons (
+    ID GUID NOT NULL PRIMARY KEY,
+    Cg_ID GUID NOT NULL REFERENCES nom_contragents (ID) ON DELETE CASCADE,
+    Code VARCHAR(20) UNIQUE,
+    Name VARCHAR(200) NOT NULL,
+    Egn VARCHAR(20),
+    IsActive BOOLEAN DEFAULT 1,
+    IsMol BOOLEAN DEFAULT 0,
+    IsOsp BOOLEAN DEFAULT 0,
+    IsDefMol BOOLEAN DEFAULT 0,
+    IsDefOsp BOOLEAN DEFAULT 0,
+    IsContact BOOLEAN DEFAULT 0,
+    PhoneWork VARCHAR(100),
+    PhoneMobile VARCHAR(100),
+    Email VARCHAR(255),
+    EmailMode INTEGER DEFAULT 0,
+    PosCard VARCHAR(50),
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+CREATE INDEX ix_nom_cgpersons_cg ON nom_cgpersons (Cg_ID);
+
+CREATE TABLE nom_cgaddresses (
+    ID GUID NOT NULL PRIMARY KEY,
+    Cg_ID GUID NOT NULL REFERENCES nom_contragents (ID) ON DELETE CASCADE,
+    Name VARCHAR(255) NOT NULL,
+    IsDefault BOOLEAN DEFAULT 0,
+    Country_ID GUID,
+    City_ID GUID,
+    PostalCode VARCHAR(20),
+    Street_ID GUID,
+    StreetNo VARCHAR(20),
+    BlockNo VARCHAR(20),
+    Entrance VARCHAR(20),
+    FloorNo VARCHAR(20),
+    Apartment VARCHAR(20),
+    Place VARCHAR(255)
+);
+CREATE INDEX ix_nom_cgaddresses_cg ON nom_cgaddresses (Cg_ID);
+
+CREATE TABLE nom_cgbankaccounts (
+    ID GUID NOT NULL PRIMARY KEY,
+    Cg_ID GUID NOT NULL REFERENCES nom_contragents (ID) ON DELETE CASCADE,
+    Name VARCHAR(200),
+    AccountCode VARCHAR(50) NOT NULL,
+    BankCode VARCHAR(20),
+    CurrencyCode VARCHAR(10),
+    UNIQUE (AccountCode, BankCode)
+);
+CREATE INDEX ix_nom_cgbankaccounts_cg ON nom_cgbankaccounts (Cg_ID);
+
+CREATE TABLE nom_cgdepartments (
+    ID GUID NOT NULL PRIMARY KEY,
+    Cg_ID GUID NOT NULL REFERENCES nom_contragents (ID) ON DELETE CASCADE,
+    Code VARCHAR(20) UNIQUE,
+    Name VARCHAR(200) NOT NULL,
+    Bulstat VARCHAR(20),
+    Address VARCHAR(255),
+    GlobalLocationNumber VARCHAR(20),
+    Note VARCHAR(1000),
+    Categories VARCHAR(255),
+    CgStore_ID GUID,
+    DeliveryAddress_ID GUID,
+    BankAcc_ID GUID,
+    PrsMol_ID GUID
+);
+CREATE INDEX ix_nom_cgdepartments_cg ON nom_cgdepartments (Cg_ID);
+
+-- The dimension values of a partner: one row per value.
+CREATE TABLE nom_cgdimlinks (
+    ID GUID NOT NULL PRIMARY KEY,
+    Cg_ID GUID NOT NULL REFERENCES nom_contragents (ID) ON DELETE CASCADE,
+    Dimension_ID GUID NOT NULL REFERENCES nom_cgdimensions (ID),
+    DimValue_ID GUID NOT NULL REFERENCES nom_cgdimvalues (ID),
+    UNIQUE (Cg_ID, DimValue_ID)
+);
+CREATE INDEX ix_nom_cgdimlinks_value ON nom_cgdimlinks (DimValue_ID);
+)sql";
+
 constexpr Migration kMigrations[] = {
     {1, "users, groups, rights and settings", kMigration1},
     {2, "currencies, banks and currency rates", kMigration2},
+    {4, "business partners", kMigration4},
 };
 
 int currentVersion(Database& db) {
@@ -166,7 +355,12 @@ static void migrate(Database& db) {
                   "The database is of schema version " + std::to_string(have) +
                       ", newer than this program knows (" + std::to_string(schemaVersion()) + ")",
                   "Database");
-        if (m.version <= have) continue;
+        // Each version is looked up by itself: a version numbered below one
+        // already applied (branches merged in another order) still runs.
+        auto applied = db.prepare("SELECT 1 FROM sys_migrations WHERE Version = ?1");
+        applied->bind(1, Variant(m.version));
+        if (applied->step()) continue;
+        applied.reset();
         db.execute(m.sql);
         auto st =
             db.prepare("INSERT INTO sys_migrations (Version, Name, AppliedOn) VALUES (?1, ?2, ?3)");

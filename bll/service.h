@@ -95,6 +95,7 @@ struct DemoOptions {
     int banks = 3;              // banks publishing rates (at least 1)
     int rateDays = 30;          // days of rates per bank
     int currenciesPerRate = 4;  // rows per rate record (at most the currencies known)
+    int partners = 40;          // business partners
     uint64_t seed = 20240101;
 };
 // Fills an empty, migrated database: users `admin` (administrators) and

@@ -164,9 +164,13 @@ void QuickFilterExtender::Apply() {
         bool handled = false;
         raise(events_.FilterClause, f.id, f.text, clause, handled);
         if (!handled) {
+            // Quotes doubled, wildcards bracketed: the text matches itself.
             std::string quoted;
             for (char c : f.text) {
-                quoted += c;
+                if (c == '*' || c == '%' || c == '[')
+                    quoted += std::string("[") + c + "]";
+                else
+                    quoted += c;
                 if (c == '\'') quoted += '\'';
             }
             for (const auto& name : f.fields)

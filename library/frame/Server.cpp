@@ -3,6 +3,7 @@
 #include "library/frame/LibObject.h"
 #include "library/frame/cFormDispatcher.h"
 #include "library/other/ctxRatios.h"
+#include "library/partners/ctxContragents.h"
 #include "platform/automation/registry.h"
 
 namespace PeltaNom15 {
@@ -25,7 +26,7 @@ const pelta::InprocServer& server() {
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0003}", "ctxFlat", nullptr},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0004}", "ctxDocTypes", nullptr},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0005}", "ctxAccAccounts", nullptr},
-            {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0006}", "ctxContragents", nullptr},
+            {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0006}", "ctxContragents", &create<ctxContragents>},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0007}", "ctxRatios", &create<ctxRatios>},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0008}", "ctxPriceLists", nullptr},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0009}", "ctxDimensions", nullptr},

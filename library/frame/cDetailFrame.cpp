@@ -230,25 +230,36 @@ void cDetailFrame::m_oForm_Save(bool& Cancel) {
         request->writeProperty("Head", pelta::Variant(pelta::ObjectRef(m_rsHead)));
         pvWriteSaveRequest(*request);
         request->writeProperty("NeedFetch", pelta::Variant(false));
-        request->writeProperty("NeedList", pelta::Variant(m_oDef.ListName));
-        auto response =
-            CallBll(m_oForm.get(), m_oConnection.get(), m_oDef.UpdateOperation, request.get());
-        if (!response) {
+        request->writeProperty(
+            "NeedList",
+            pelta::Variant(m_oDef.NeedList.empty() ? m_oDef.ListName : m_oDef.NeedList));
+        // A form may answer a refusal by sending the request again (after the
+        // user agreed to a duplicate); never more often than this.
+        constexpr int32_t kMaxAttempts = 4;
+        PropertyBagRef response;
+        for (int32_t attempt = 1;; ++attempt) {
+            response =
+                CallBll(m_oForm.get(), m_oConnection.get(), m_oDef.UpdateOperation, request.get());
+            if (!response) {
+                Cancel = true;
+                return;
+            }
+            if (response->readProperty("BllError").isEmpty()) break;
+            // Everything the answer carries is read before its verdict; the
+            // form's data is replaced only when the save went through, so
+            // that a refused save leaves the user's edits where they were.
+            SaveRefusal what = pvSaveRefused(*response, *request, attempt);
+            if (what == SaveRefusal::Retry && attempt < kMaxAttempts) continue;
+            if (what != SaveRefusal::Handled) {
+                const std::string rowID = C2Str(response->readProperty("BllRowID"));
+                if (rowID.empty() || !pvShowRowError(*response, rowID))
+                    ShowBllError(m_oForm.get(), response.get());
+            }
             Cancel = true;
             return;
         }
-        // Everything the answer carries is read before its verdict; the
-        // form's data is replaced only when the save went through, so that a
-        // refused save leaves the user's edits where they were.
         auto head = RecordsetProperty(response.get(), "Head");
         auto listRow = RecordsetProperty(response.get(), "ListResult");
-        if (!response->readProperty("BllError").isEmpty()) {
-            const std::string rowID = C2Str(response->readProperty("BllRowID"));
-            if (rowID.empty() || !pvShowRowError(*response, rowID))
-                ShowBllError(m_oForm.get(), response.get());
-            Cancel = true;
-            return;
-        }
         if (!head || head->recordCount() == 0) {
             Cancel = true;
             return;
@@ -275,6 +286,10 @@ void cDetailFrame::m_oForm_QueryStandalone(bool& Cancel) {
 
 void cDetailFrame::m_oForm_BeforeExecute(int32_t CommandID, bool& Handled) {
     try {
+        if (pvExecute(CommandID)) {
+            Handled = true;
+            return;
+        }
         if (CommandID != kCmdDelete) return;
         Handled = true;
         pvDelete();

@@ -26,6 +26,9 @@ struct DetailDefinition {
     int32_t HelpID = 0;
     std::string LayoutKey;
     std::string ListName;  // "ctxRatios": refreshed after a save, and whose rights apply
+    // "NeedList" of the save when it names more lists ("ctxPr|ctxContragents");
+    // empty: ListName.
+    std::string NeedList;
     std::string ReadOperation;
     std::string UpdateOperation;
     std::string DeleteOperation;
@@ -71,6 +74,21 @@ protected:
     virtual void pvUpload() {}
     // Request properties of the save beyond "Head", "NeedFetch", "NeedList".
     virtual void pvWriteSaveRequest(pelta::PropertyBag& Request) {}
+    // What became of a refused save (a "BllError" in the answer).
+    enum class SaveRefusal {
+        Show,     // the frame shows it (pvShowRowError, then the common message)
+        Handled,  // the form told the user; the save is cancelled
+        Retry,    // the form changed the request: send it again
+    };
+    // Asked for every refusal; `Attempt` counts the calls of this save from
+    // 1. The frame sends a request again a few times at most.
+    virtual SaveRefusal pvSaveRefused(pelta::PropertyBag& Response, pelta::PropertyBag& Request,
+                                      int32_t Attempt) {
+        return SaveRefusal::Show;
+    }
+    // Commands of the form, asked before the frame's own (118 delete); true
+    // when performed.
+    virtual bool pvExecute(int32_t CommandID) { return false; }
     // A refused save that names a row: positions on it and tells the user.
     // False when the form has no row of that kind (the frame then shows the
     // refusal itself).

@@ -102,7 +102,7 @@ void cListFrame::m_oForm_Fetch(int32_t Step, bool& Cancel) {
         // An operation without parameters gets no bytes at all.
         auto response = CallBll(m_oForm.get(), m_oConnection.get(), m_oDef.ReadOperation,
                                 request->count() ? request.get() : nullptr);
-        if (!response) {
+        if (!response || !pvTakeFetchResponse(*response)) {
             Cancel = true;
             return;
         }
@@ -133,6 +133,10 @@ void cListFrame::m_oForm_FillControls() {
 
 void cListFrame::m_oForm_BeforeExecute(int32_t CommandID, bool& Handled) {
     try {
+        if (pvExecute(CommandID)) {
+            Handled = true;
+            return;
+        }
         switch (CommandID) {
             case kCmdNew:
                 Handled = true;
@@ -154,7 +158,6 @@ void cListFrame::m_oForm_BeforeExecute(int32_t CommandID, bool& Handled) {
                 m_oForm->Refresh();
                 break;
             default:
-                Handled = pvExecute(CommandID);
                 break;
         }
     } catch (...) {

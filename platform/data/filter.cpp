@@ -744,14 +744,11 @@ private:
             case FieldType::LongText: {
                 TextMode mode = TextMode::Equal;
                 std::string_view p = v.text;
+                std::string literal;
                 if (n.op == Op::Like) {
                     bool lead = false, trail = false;
-                    while (!p.empty() && (p.front() == '*' || p.front() == '%'))
-                        p.remove_prefix(1), lead = true;
-                    while (!p.empty() && (p.back() == '*' || p.back() == '%'))
-                        p.remove_suffix(1), trail = true;
-                    if (p.find_first_of("*%") != std::string_view::npos)
-                        badValue("a LIKE pattern may have '*' or '%' only at its start and end");
+                    literal = likeLiteral(p, lead, trail);
+                    p = literal;
                     mode = lead && trail ? (p.empty() ? TextMode::Any : TextMode::Contains)
                            : lead        ? TextMode::Suffix
                            : trail       ? TextMode::Prefix
@@ -764,6 +761,39 @@ private:
             case FieldType::Binary:
                 lex_.fail(opPos, "binary fields cannot be compared");
         }
+    }
+
+    // The literal text of a LIKE pattern: wildcards ('*', '%') only at its
+    // start and end; a character in brackets ("[*]", "[%]", "[[]") stands for
+    // itself anywhere.
+    std::string likeLiteral(std::string_view p, bool& lead, bool& trail) const {
+        while (!p.empty() && (p.front() == '*' || p.front() == '%'))
+            p.remove_prefix(1), lead = true;
+        std::string out;
+        size_t i = 0;
+        while (i < p.size()) {
+            const char c = p[i];
+            if (c == '[') {
+                size_t len = 1;  // one UTF-8 character after the bracket
+                if (i + 1 < p.size()) {
+                    const auto b = static_cast<uint8_t>(p[i + 1]);
+                    len = b >= 0xF0 ? 4 : b >= 0xE0 ? 3 : b >= 0xC0 ? 2 : 1;
+                }
+                if (i + 1 + len < p.size() && p[i + 1 + len] == ']') {
+                    out.append(p.substr(i + 1, len));
+                    i += len + 2;
+                    continue;
+                }
+            } else if (c == '*' || c == '%') {
+                if (p.find_first_not_of("*%", i) != std::string_view::npos)
+                    badValue("a LIKE pattern may have '*' or '%' only at its start and end");
+                trail = true;
+                break;
+            }
+            out.push_back(c);
+            ++i;
+        }
+        return out;
     }
 
     static bool toDouble(std::string_view s, double& out) {

@@ -11,9 +11,9 @@
 //               | TRUE | FALSE | NULL
 //
 // `field = NULL` and `field <> NULL` test for Null. LIKE takes '*' or '%' at
-// the start and/or end of the pattern only. Text compares without regard to
-// case. Errors raise rserr::InvalidArgument naming the 1-based character
-// position.
+// the start and/or end of the pattern only; a character in brackets stands
+// for itself ("[*]", "[%]", "[[]"), so that any typed text can be searched. Text compares without
+// regard to case. Errors raise rserr::InvalidArgument naming the 1-based character position.
 #pragma once
 
 #include <cstdint>

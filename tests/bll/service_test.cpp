@@ -86,10 +86,12 @@ TEST_F(ServiceTest, ConnectionKnowsItsUserAndParameters) {
 
 TEST_F(ServiceTest, MigrationsRunOnceAndANewerDatabaseIsRefused) {
     auto db = pelta::bll::openDatabase(path_);
-    auto st = db->prepare("SELECT COUNT(*), MAX(Version) FROM sys_migrations");
+    // Each once (numbers kept for other branches may be missing here).
+    auto st =
+        db->prepare("SELECT COUNT(*), COUNT(DISTINCT Version), MAX(Version) FROM sys_migrations");
     ASSERT_TRUE(st->step());
-    EXPECT_EQ(st->int64(0), pelta::bll::schemaVersion());
-    EXPECT_EQ(st->int64(1), pelta::bll::schemaVersion());
+    EXPECT_EQ(st->int64(0), st->int64(1));
+    EXPECT_EQ(st->int64(2), pelta::bll::schemaVersion());
     st.reset();
     db->execute("INSERT INTO sys_migrations VALUES (999, 'from the future', 0)");
     db.reset();

@@ -223,6 +223,12 @@ TEST_F(Grid, QuickFilterNarrowsTheGridWithinItsGroup) {
     filter->Apply();
     EXPECT_EQ(g->rowCount(), 1);
     EXPECT_EQ(idOfCurrent(*g), kRateUcb);
+    // Typed quotes and wildcards are the text itself.
+    for (const char* typed : {"'", "*", "%", "к*д", "[x]"}) {
+        filter->SetText(1, typed);
+        EXPECT_NO_THROW(filter->Apply()) << typed;
+        EXPECT_EQ(g->rowCount(), 0) << typed;
+    }
 
     // The screen builds its own clause for a field.
     filter->Events().FilterClause = [](int32_t id, const std::string& text, std::string& clause,

@@ -262,6 +262,22 @@ TEST(Filter, MalformedCriteriaNameThePosition) {
     EXPECT_EQ(rs->recordCount(), 1);
 }
 
+TEST(Filter, BracketsMakeWildcardsLiteralInLike) {
+    auto rs = data();
+    // Notes: "O'Brien", Null, "note", "*star*", "50%".
+    EXPECT_EQ(matching(*rs, "Note LIKE '*[*]*'"), Ids({4}));
+    EXPECT_EQ(matching(*rs, "Note LIKE '[*]star[*]'"), Ids({4}));
+    EXPECT_EQ(matching(*rs, "Note LIKE '*0[%]'"), Ids({5}));
+    EXPECT_EQ(matching(*rs, "Note LIKE '*[%]*'"), Ids({5}));
+    EXPECT_EQ(matching(*rs, "Note LIKE 'o''b*'"), Ids({1}));
+    // A wildcard escaped in the middle is allowed; a bracket not closing one
+    // character is itself.
+    EXPECT_EQ(matching(*rs, "Note LIKE '*t[a]r*'"), Ids({4}));
+    EXPECT_EQ(matching(*rs, "Note LIKE '*[st*'"), Ids({}));
+    EXPECT_EQ(matching(*rs, "Name LIKE '[и]ван*'"), Ids({1, 2}));
+    EXPECT_EQ(failure(*rs, "Note LIKE '*[*]a*b'").first, rserr::InvalidArgument);
+}
+
 TEST(Filter, DeepNestingIsRefusedNotOverflowed) {
     auto rs = data();
     std::string deep(100000, '(');
