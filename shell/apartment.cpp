@@ -11,9 +11,13 @@ std::mutex& apartment() {
 thread_local std::unique_lock<std::mutex>* t_lock = nullptr;
 }  // namespace
 
-ApartmentScope::ApartmentScope() : lock_(apartment()) { t_lock = &lock_; }
+ApartmentScope::ApartmentScope() : lock_(apartment()) {
+    t_lock = &lock_;
+}
 
-ApartmentScope::~ApartmentScope() { t_lock = nullptr; }
+ApartmentScope::~ApartmentScope() {
+    t_lock = nullptr;
+}
 
 ApartmentRelease::ApartmentRelease() : held_(t_lock && t_lock->owns_lock() ? t_lock : nullptr) {
     if (held_) held_->unlock();

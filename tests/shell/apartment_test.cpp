@@ -32,10 +32,10 @@ TEST(Apartment, TasksOfDifferentSessionsNeverRunAtOnce) {
     UiThread a, b, c;
     std::vector<std::future<void>> done;
     for (int i = 0; i < 200; ++i)
-        for (UiThread* t : {&a, &b, &c}) done.push_back(std::async(std::launch::async, [=] {
-                                             t->call(task);
-                                         }));
-    for (auto& d : done) d.get();
+        for (UiThread* t : {&a, &b, &c})
+            done.push_back(std::async(std::launch::async, [=] { t->call(task); }));
+    for (auto& d : done)
+        d.get();
     EXPECT_EQ(most.load(), 1);
 }
 
@@ -45,8 +45,8 @@ TEST(Apartment, ASessionWaitingForAnAnswerLetsOthersRun) {
     UiThread asking, other;
     auto answer = std::async(std::launch::async, [&] {
         return asking.call([&] {
-            return broker.messageBox("Желаете ли да изтриете номенклатурата?",
-                                     vbYesNo | vbQuestion, "", "");
+            return broker.messageBox("Желаете ли да изтриете номенклатурата?", vbYesNo | vbQuestion,
+                                     "", "");
         });
     });
     uint64_t seen = 0;
