@@ -43,6 +43,7 @@ void terminateObject(pelta::Object* o) {
 std::string knownCaption(const std::string& objectName) {
     static const std::pair<const char*, const char*> kCaptions[] = {
         {"ctxRatios", "Валутни курсове"},
+        {"ctxContragents", "Контрагенти"},
         {"ctxItems", "Продукти и материали"},
         {"ctxItemsReserved", "Запазени количества"},
         {"ctxLocks", "Работни периоди"},
