@@ -118,6 +118,14 @@ bool TabExtender::click(int32_t tab) {
 
 // ---- QuickFilterExtender ------------------------------------------------------------
 
+QuickFilterExtender::QuickFilterExtender() {
+    services()->addQuickFilter(this);
+}
+
+QuickFilterExtender::~QuickFilterExtender() {
+    services()->removeQuickFilter(this);
+}
+
 void QuickFilterExtender::Init(pelta::Object* Owner, IGridExtender* Grid, const std::string& Hint) {
     setOwner(Owner);
     grid_ = Grid;

@@ -93,8 +93,15 @@ private:
 
 // Filters a grid by typed texts. A field whose clause the screen does not
 // build matches rows where any of its fields contains the text.
+// Registers itself with the services while it lives, so that a host finds
+// the quick filters of a screen it did not make (quickFiltersOfOwner).
 class QuickFilterExtender : public PeltaNom15::IQuickFilterExtender, public ExtenderBase {
 public:
+    QuickFilterExtender();
+    ~QuickFilterExtender() override;
+    QuickFilterExtender(const QuickFilterExtender&) = delete;
+    QuickFilterExtender& operator=(const QuickFilterExtender&) = delete;
+
     PeltaNom15::QuickFilterEvents& Events() override { return events_; }
     void Init(pelta::Object* Owner, PeltaNom15::IGridExtender* Grid,
               const std::string& Hint) override;
@@ -115,6 +122,8 @@ public:
     };
     const std::vector<Field>& fields() const noexcept { return fields_; }
     const std::string& hint() const noexcept { return hint_; }
+    // The grid the filter applies to; null before Init.
+    PeltaNom15::IGridExtender* grid() const noexcept { return grid_.get(); }
 
 private:
     Field& fieldRef(int32_t id);

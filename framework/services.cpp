@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <system_error>
 
+#include "framework/extenders.h"
 #include "framework/form_extender.h"
 #include "framework/grid_extender.h"
 #include "framework/record_deletion.h"
@@ -422,6 +423,29 @@ std::vector<GridExtender*> FrameworkServices::gridsOfOwner(const pelta::Object* 
     std::lock_guard lock(mutex_);
     for (const auto& g : grids_)
         if (g.second == self && g.first->owner() == owner) out.push_back(g.first);
+    return out;
+}
+
+void FrameworkServices::addQuickFilter(QuickFilterExtender* filter) {
+    std::lock_guard lock(mutex_);
+    quickFilters_.emplace_back(filter, std::this_thread::get_id());
+}
+
+void FrameworkServices::removeQuickFilter(QuickFilterExtender* filter) {
+    std::lock_guard lock(mutex_);
+    quickFilters_.erase(std::remove_if(quickFilters_.begin(), quickFilters_.end(),
+                                       [&](const auto& f) { return f.first == filter; }),
+                        quickFilters_.end());
+}
+
+std::vector<QuickFilterExtender*> FrameworkServices::quickFiltersOfOwner(
+    const pelta::Object* owner) const {
+    std::vector<QuickFilterExtender*> out;
+    if (!owner) return out;
+    const auto self = std::this_thread::get_id();
+    std::lock_guard lock(mutex_);
+    for (const auto& f : quickFilters_)
+        if (f.second == self && f.first->owner() == owner) out.push_back(f.first);
     return out;
 }
 

@@ -21,6 +21,7 @@ namespace pelta::fw {
 
 class FormExtender;
 class GridExtender;
+class QuickFilterExtender;
 class RecordDeletion;
 
 // Writes the host's log files: each Open appends to the named file.
@@ -188,6 +189,10 @@ public:
     // The grids made on the calling thread whose owner is `owner`, in the
     // order they were made.
     std::vector<GridExtender*> gridsOfOwner(const pelta::Object* owner) const;
+    // Live quick filters, registered as grids are.
+    void addQuickFilter(QuickFilterExtender* filter);
+    void removeQuickFilter(QuickFilterExtender* filter);
+    std::vector<QuickFilterExtender*> quickFiltersOfOwner(const pelta::Object* owner) const;
 
     // Back to a fresh state: default host, no agent, empty settings in
     // memory, nothing refused, pointer 0. Live forms stay registered.
@@ -204,6 +209,7 @@ private:
     std::set<std::string> refused_;  // lower-case
     std::vector<std::pair<FormExtender*, std::thread::id>> forms_;
     std::vector<std::pair<GridExtender*, std::thread::id>> grids_;
+    std::vector<std::pair<QuickFilterExtender*, std::thread::id>> quickFilters_;
     int32_t mousePointer_ = 0;
 };
 

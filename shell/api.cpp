@@ -155,14 +155,20 @@ json describeScreen(int64_t id, Screen& s) {
                             {"options", describeOptions(c.options)}});
     }
     json grids = json::array();
-    for (const GridInfo& g : s.grids())
+    for (const GridInfo& g : s.grids()) {
+        json filters = json::array();
+        for (const FilterFieldInfo& f : g.filters)
+            filters.push_back({{"id", f.id}, {"caption", f.caption}, {"text", f.text}});
         grids.push_back({{"name", g.name},
                          {"columns", describeColumns(g.columns)},
                          {"rowCount", g.rowCount},
                          {"editable", g.editable},
                          {"groupColumn", g.groupColumn},
                          {"groups", g.groups},
-                         {"group", g.group}});
+                         {"group", g.group},
+                         {"filters", filters},
+                         {"filterHint", g.filterHint}});
+    }
     return {{"id", id},
             {"kind", s.kind()},
             {"caption", s.caption()},
@@ -465,6 +471,21 @@ ApiResponse Api::route(const ApiRequest& r) {
                 throw ApiError(400, "Unknown group");
             screen->setGroup(grid.name, value);
             return json{{"ok", true}};
+        }));
+    }
+    if (action == "filter") {
+        std::string gridName = stringField(body, "grid", false);
+        auto field = static_cast<int32_t>(integerField(body, "field", INT32_MIN, INT32_MAX));
+        std::string text = stringField(body, "text", false);
+        if (text.size() > 1000) throw ApiError(400, "The filter text is too long");
+        return ok(s.ui().call([&] {
+            auto screen = needScreen();
+            GridInfo grid = findGrid(*screen, gridName);
+            if (std::none_of(grid.filters.begin(), grid.filters.end(),
+                             [&](const FilterFieldInfo& f) { return f.id == field; }))
+                throw ApiError(400, "Unknown filter field");
+            screen->setFilter(grid.name, field, text);
+            return json{{"ok", true}, {"total", screen->rows(grid.name, 0, 1, {}).total}};
         }));
     }
     if (action == "execute") {

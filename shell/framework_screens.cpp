@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "bll/service.h"
+#include "framework/extenders.h"
 #include "framework/form_extender.h"
 #include "framework/framework.h"
 #include "framework/grid_extender.h"
@@ -150,6 +151,15 @@ std::vector<std::pair<std::string, std::string>> optionsOf(const RecordsetRef& r
     return out;
 }
 
+// A quick-filter field whose caption is a key ("cg-grp") is set by the
+// screen's own controls (a filter tree); the person types into the others.
+bool typedFilterField(const fw::QuickFilterExtender::Field& f) {
+    if (f.caption.empty()) return false;
+    return !std::all_of(f.caption.begin(), f.caption.end(), [](char c) {
+        return (c >= 'a' && c <= 'z') || (c >= '0' && c <= '9') || c == '-' || c == '_';
+    });
+}
+
 // A grid's rows one page at a time, read from a clone of the grid's view
 // with the view's filter (and, when asked, a sort of its own), so that the
 // grid's cursor, marks and the screen's recordset never move. The clone is
@@ -268,6 +278,11 @@ public:
                 info.group = text(g->groupValue());
                 if (info.group.empty()) info.group = fw::kAllGroups;
             }
+            if (fw::QuickFilterExtender* q = quickFilterOf(*g)) {
+                info.filterHint = q->hint();
+                for (const auto& f : q->fields())
+                    if (typedFilterField(f)) info.filters.push_back({f.id, f.caption, f.text});
+            }
             out.push_back(std::move(info));
         }
         return out;
@@ -291,6 +306,21 @@ public:
         refuse("The grid " + grid + " has no group " + value);
     }
 
+    void setFilter(const std::string& grid, int32_t field, const std::string& value) override {
+        fw::GridExtender& g = gridNamed(grid);
+        fw::QuickFilterExtender* q = quickFilterOf(g);
+        if (!q) refuse("The grid " + grid + " has no quick filter");
+        const auto& fields = q->fields();
+        auto f = std::find_if(fields.begin(), fields.end(),
+                              [&](const auto& x) { return x.id == field && typedFilterField(x); });
+        if (f == fields.end())
+            refuse("The quick filter of " + grid + " has no field " + std::to_string(field));
+        pelta::Ref<fw::QuickFilterExtender> keep(q);
+        keep->SetText(field, value);
+        invalidate();
+        keep->Apply();
+    }
+
     // The grids' rows may have changed: pages are cut anew.
     void invalidate() {
         for (auto& [name, pager] : pagers_)
@@ -311,6 +341,13 @@ protected:
     std::vector<fw::GridExtender*> gridExtenders() const {
         if (!owner_) return {};
         return fw::services()->gridsOfOwner(owner_.get());
+    }
+
+    fw::QuickFilterExtender* quickFilterOf(fw::GridExtender& grid) const {
+        if (!owner_) return nullptr;
+        for (fw::QuickFilterExtender* q : fw::services()->quickFiltersOfOwner(owner_.get()))
+            if (pelta::query<fw::GridExtender>(q->grid()) == &grid) return q;
+        return nullptr;
     }
 
     fw::GridExtender& gridNamed(const std::string& name) {

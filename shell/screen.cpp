@@ -25,4 +25,9 @@ void Screen::setGroup(const std::string& grid, const std::string&) {
                  "pelta.shell");
 }
 
+void Screen::setFilter(const std::string& grid, int32_t, const std::string&) {
+    pelta::raise(pelta::errc::InvalidProcedureCall, "The grid " + grid + " has no quick filter",
+                 "pelta.shell");
+}
+
 }  // namespace pelta::shell

@@ -30,6 +30,13 @@ struct ColumnInfo {
     std::vector<std::pair<std::string, std::string>> options;
 };
 
+// A field of a grid's quick filter: text typed to narrow the rows.
+struct FilterFieldInfo {
+    int32_t id = 0;
+    std::string caption;
+    std::string text;  // as applied
+};
+
 struct GridInfo {
     std::string name;
     std::vector<ColumnInfo> columns;
@@ -40,6 +47,10 @@ struct GridInfo {
     std::string groupColumn;
     std::vector<std::string> groups;
     std::string group;
+    // The quick filter's fields the person types into, and its hint
+    // ("(префикс '/' за код ...)").
+    std::vector<FilterFieldInfo> filters;
+    std::string filterHint;
 };
 
 struct CommandInfo {
@@ -123,6 +134,9 @@ public:
     // Grouped grids: shows the group `value` (the first of GridInfo::groups
     // shows every group).
     virtual void setGroup(const std::string& grid, const std::string& value);
+    // Quick filters: the text of field `field` of `grid`'s quick filter,
+    // applied to the rows at once.
+    virtual void setFilter(const std::string& grid, int32_t field, const std::string& text);
 
     // The termination protocol: may refuse (unsaved edits the person keeps).
     virtual bool queryTerminate() = 0;

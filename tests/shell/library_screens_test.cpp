@@ -1,12 +1,13 @@
 // The shell over the real library, framework and service: the currency-rate
-// screens driven through the JSON interface as the page drives them, on a
-// temporary demo database.
+// and partner screens driven through the JSON interface as the page drives
+// them, on a temporary demo database.
 #include <gtest/gtest.h>
 #include <stdlib.h>
 
 #include <algorithm>
 #include <filesystem>
 #include <future>
+#include <set>
 
 #include "bll/database.h"
 #include "bll/service.h"
@@ -131,6 +132,55 @@ protected:
     std::string bank() { return scalar("SELECT ID FROM nom_banks ORDER BY Name LIMIT 1"); }
     std::string currency(const std::string& code) {
         return scalar("SELECT ID FROM nom_currencies WHERE Code = '" + code + "'");
+    }
+
+    // ---- partners
+
+    int64_t openPartners() {
+        json list = ok("POST", "/api/lists", R"({"id":"PeltaNom15.ctxContragents"})");
+        return list["id"];
+    }
+    // The list's quick-filter text applied; answers the rows it leaves.
+    int64_t filter(int64_t list, const std::string& text) {
+        json grid = ok("GET", path(list))["grids"][0];
+        json r =
+            ok("POST", path(list, "filter"),
+               json{{"grid", grid["name"]}, {"field", grid["filters"][0]["id"]}, {"text", text}}
+                   .dump());
+        EXPECT_EQ(r["total"], ok("GET", path(list, "rows"), {}, {{"count", "1"}})["total"]);
+        return r["total"];
+    }
+    // The position of a list column by its key.
+    static size_t column(const json& screen, const std::string& key) {
+        const json& columns = screen["grids"][0]["columns"];
+        for (size_t i = 0; i < columns.size(); ++i)
+            if (columns[i]["key"] == key) return i;
+        ADD_FAILURE() << "no column " << key;
+        return 0;
+    }
+    static const json& control(const json& screen, const std::string& name) {
+        for (const json& c : screen["controls"])
+            if (c["name"] == name) return c;
+        throw std::runtime_error("no control " + name);
+    }
+    // Runs a command that shows a detail form; answers the form's screen.
+    int64_t showing(int64_t list, const json& body) {
+        uint64_t after = live().events().lastSequence();
+        EXPECT_EQ(ok("POST", path(list, "execute"), body.dump())["handled"], true);
+        return nextEvent(live().events(), "screen", after)["screen"];
+    }
+    void setValue(int64_t screen, const std::string& name, const json& value) {
+        ok("POST", path(screen, "values"), json{{"control", name}, {"value", value}}.dump());
+    }
+    // A valid company number of eight digits and their check digit.
+    static std::string companyNumber(const std::string& eight) {
+        int a = 0, b = 0;
+        for (int i = 0; i < 8; ++i) {
+            a += (eight[i] - '0') * (i + 1);
+            b += (eight[i] - '0') * (i + 3);
+        }
+        int c = a % 11 == 10 ? (b % 11) % 10 : a % 11;
+        return eight + static_cast<char>('0' + c);
     }
 
     fs::path dir_;
@@ -306,6 +356,105 @@ TEST_F(LibraryScreensTest, ASessionEndingDuringAQuestionUnwindsTheScreen) {
     sessions_->release(session_);  // the tab went away mid-question
     EXPECT_LT(pending.get().status, 500);
     EXPECT_EQ(count("SELECT COUNT(*) FROM nom_currratios"), before) << "answered No";
+}
+
+TEST_F(LibraryScreensTest, ThePartnersListOffersItsQuickFilterAndFiltersOnTheServer) {
+    int64_t list = openPartners();
+    json d = ok("GET", path(list));
+    EXPECT_EQ(d["caption"], "Контрагенти");
+    const json& grid = d["grids"][0];
+    const int64_t all = count("SELECT COUNT(*) FROM nom_contragents");
+    ASSERT_GT(all, 10);
+    EXPECT_EQ(grid["rowCount"], all);
+    EXPECT_EQ(grid["filterHint"],
+              "(префикс '/' за търсене по код, '//' за търсене по адрес и др.)");
+    // Only the typed field is offered: the tree's type and group fields are the list's own.
+    ASSERT_EQ(grid["filters"].size(), 1u) << grid["filters"].dump();
+    EXPECT_EQ(grid["filters"][0]["caption"], "Търсене");
+    EXPECT_EQ(grid["filters"][0]["text"], "");
+
+    // A page of rows, then the name search, the code search and the address search.
+    EXPECT_EQ(ok("GET", path(list, "rows"), {}, {{"count", "7"}})["rows"].size(), 7u);
+    const std::string name = scalar("SELECT Name FROM nom_contragents WHERE Code = '3'");
+    EXPECT_EQ(filter(list, name),
+              count("SELECT COUNT(*) FROM nom_contragents WHERE instr(Name, '" + name + "') > 0"));
+    json rows = ok("GET", path(list, "rows"), {}, {{"count", "100"}});
+    const size_t nameColumn = column(d, "Name");
+    for (const json& row : rows["rows"])
+        EXPECT_NE(row["cells"][nameColumn].get<std::string>().find(name), std::string::npos);
+    EXPECT_EQ(ok("GET", path(list))["grids"][0]["filters"][0]["text"], name) << "the text stays";
+
+    EXPECT_EQ(filter(list, "/1"),
+              count("SELECT COUNT(*) FROM nom_contragents WHERE instr(Code, '1') > 0"));
+    const std::string phone = scalar("SELECT Phone FROM nom_contragents WHERE Code = '5'");
+    EXPECT_EQ(filter(list, "//" + phone), 1);
+    EXPECT_EQ(filter(list, "няма 'такъв' * партньор"), 0) << "quotes and stars are plain text";
+    EXPECT_EQ(filter(list, ""), all);
+
+    // Only the offered fields may be set.
+    EXPECT_EQ(call("POST", path(list, "filter"), R"({"field":803,"text":"x"})").status, 400);
+    EXPECT_EQ(call("POST", path(list, "filter"), R"({"field":"1","text":"x"})").status, 400);
+    EXPECT_EQ(call("POST", path(list, "filter"), R"({"field":1,"text":5})").status, 400);
+}
+
+TEST_F(LibraryScreensTest, APartnerFoundInTheListIsOpenedChangedAndSaved) {
+    int64_t list = openPartners();
+    const std::string name = scalar("SELECT Name FROM nom_contragents WHERE Code = '2'");
+    ASSERT_EQ(filter(list, name), 1);
+    std::string key = ok("GET", path(list, "rows"), {}, {{"count", "1"}})["rows"][0]["key"];
+    int64_t detail = showing(list, {{"command", 102}, {"current", key}});
+
+    json d = ok("GET", path(detail));
+    EXPECT_EQ(d["kind"], "detail");
+    EXPECT_EQ(control(d, "txtName")["value"], name);
+    EXPECT_EQ(control(d, "attPhone")["group"], "Основни");
+    EXPECT_FALSE(control(d, "cboCgType")["options"].empty()) << "the types are offered";
+    std::set<std::string> grids;
+    for (const json& g : d["grids"])
+        grids.insert(g["name"]);
+    for (const char* g : {"gePersons", "geAddresses", "geBankAcc"})
+        EXPECT_TRUE(grids.count(g)) << g;
+    json persons = ok("GET", path(detail, "rows"), {}, {{"grid", "gePersons"}});
+    EXPECT_EQ(persons["total"], count("SELECT COUNT(*) FROM nom_cgpersons p JOIN nom_contragents "
+                                      "c ON c.ID = p.Cg_ID WHERE c.Code = '2'"));
+
+    setValue(detail, "attPhone", "+359 2 9876543");
+    ASSERT_EQ(ok("POST", path(detail, "save"), "{}")["saved"], true);
+    EXPECT_EQ(scalar("SELECT Phone FROM nom_contragents WHERE Code = '2'"), "+359 2 9876543");
+    // The list shows the saved row, still filtered.
+    json rows = ok("GET", path(list, "rows"), {}, {{"count", "5"}});
+    ASSERT_EQ(rows["total"], 1);
+    EXPECT_EQ(rows["rows"][0]["cells"][column(ok("GET", path(list)), "Phone")], "+359 2 9876543");
+}
+
+TEST_F(LibraryScreensTest, ANewPartnerIsCheckedSavedAndShownInTheList) {
+    int64_t list = openPartners();
+    const int64_t before = count("SELECT COUNT(*) FROM nom_contragents");
+    int64_t detail = showing(list, {{"command", 101}});
+    setValue(detail, "txtAddress", "гр. Варна, ул. Тестова 1");
+    // Without a name the form says so at the field.
+    auto [refusal, response] = answering(PeltaNom15::vbOK, "POST", path(detail, "save"), "{}");
+    EXPECT_EQ(refusal, "Невалидно име");
+    EXPECT_EQ(json::parse(response.body)["saved"], false);
+
+    setValue(detail, "txtName", "Браузър Тест ООД");
+    setValue(detail, "txtBulstat", companyNumber("20304050"));
+    json added = ok("POST", path(detail, "addrow"), R"({"grid":"gePersons"})");
+    ASSERT_EQ(added["added"], true);
+    json cell = ok("POST", path(detail, "cells"),
+                   json{{"grid", "gePersons"},
+                        {"row", added["key"]},
+                        {"column", "Name"},
+                        {"value", "Иван Тестов"}}
+                       .dump());
+    EXPECT_EQ(cell["ok"], true);
+    json saved = ok("POST", path(detail, "save"), "{}");
+    ASSERT_EQ(saved["saved"], true);
+    EXPECT_EQ(count("SELECT COUNT(*) FROM nom_contragents"), before + 1);
+    EXPECT_EQ(scalar("SELECT p.Name FROM nom_cgpersons p JOIN nom_contragents c ON c.ID = "
+                     "p.Cg_ID WHERE c.Name = 'Браузър Тест ООД'"),
+              "Иван Тестов");
+    EXPECT_EQ(filter(list, "Браузър Тест"), 1);
 }
 
 }  // namespace

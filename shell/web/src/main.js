@@ -162,6 +162,7 @@ function render(screen) {
   }
   for (const g of d.grids) {
     if (g.groups && g.groups.length > 1) screen.view.append(groupFilter(screen, g));
+    if (g.filters && g.filters.length) screen.view.append(quickFilter(screen, g));
     const holder = document.createElement('div');
     holder.className = 'grid';
     holder.dataset.grid = g.name;
@@ -206,6 +207,54 @@ function groupFilter(screen, g) {
   });
   label.append(select);
   return label;
+}
+
+// The grid's quick filter: a field per typed filter, the list's hint as its
+// prompt. Enter (or leaving the field) applies the text on the server.
+function quickFilter(screen, g) {
+  const bar = document.createElement('div');
+  bar.className = 'quick-filter';
+  bar.dataset.grid = g.name;
+  for (const [i, f] of g.filters.entries()) {
+    const label = document.createElement('label');
+    const caption = document.createElement('span');
+    caption.className = 'caption';
+    caption.textContent = f.caption;
+    const input = document.createElement('input');
+    input.type = 'search';
+    input.name = `filter-${f.id}`;
+    input.value = f.text;
+    if (i === 0 && g.filterHint) input.placeholder = g.filterHint;
+    input.setAttribute('aria-label', f.caption);
+    let applied = f.text;
+    const apply = async () => {
+      const text = input.value;
+      if (text === applied) return;
+      applied = text;
+      try {
+        await connection.post(`/api/screens/${screen.description.id}/filter`, { grid: g.name, field: f.id, text });
+        for (const grid of screen.grids) if (grid.name === g.name) grid.refresh();
+      } catch (e) {
+        reportError(e);
+      }
+    };
+    input.addEventListener('keydown', (e) => {
+      if (e.key === 'Enter') {
+        e.preventDefault();
+        apply();
+      }
+    });
+    input.addEventListener('change', apply);
+    label.append(caption, input);
+    bar.append(label);
+  }
+  if (g.filterHint) {
+    const hint = document.createElement('small');
+    hint.className = 'hint';
+    hint.textContent = g.filterHint;
+    bar.append(hint);
+  }
+  return bar;
 }
 
 function activate(id) {
