@@ -407,6 +407,12 @@ bool GridExtender::columnVisible(const std::string& column) {
     return show;
 }
 
+pelta::Variant GridExtender::fetchData(const pelta::Variant& bookmark, const std::string& column) {
+    pelta::Variant value;
+    raise(events_.FetchData, bookmark, column, value);
+    return value;
+}
+
 RowFormatArgs GridExtender::formatRow(const pelta::Variant& bookmark) {
     RowFormatArgs args;
     args.Bookmark = bookmark;

@@ -96,6 +96,9 @@ public:
 
     // Whether a column is shown: declared visible and CanShowColumn agrees.
     bool columnVisible(const std::string& column);
+    // The value a host paints in a column with no field in the rows (an
+    // icon, a computed text): FetchData is asked for the row `bookmark`.
+    pelta::Variant fetchData(const pelta::Variant& bookmark, const std::string& column);
     // The formatting of the row at `bookmark` (RowFormat).
     PeltaNom15::RowFormatArgs formatRow(const pelta::Variant& bookmark);
 

@@ -182,6 +182,10 @@ public:
             order_ = order;
         }
         auto columns = grid.Columns();
+        // Shown columns with no field are computed by the screen, row by row.
+        std::vector<bool> computed;
+        for (const ColumnDecl& c : columns)
+            computed.push_back(c.Field.empty() && grid.columnVisible(c.Key));
         out.total = source_->recordCount();
         if (offset >= out.total) return out;
         source_->setAbsolutePosition(offset + 1);
@@ -189,9 +193,12 @@ public:
             Row row;
             row.index = offset + i;
             row.key = rowKey(source_->bookmark());
-            for (const ColumnDecl& c : columns) {
-                if (!c.Field.empty() && source_->fieldIndex(c.Field) >= 0)
-                    row.cells.push_back(source_->value(c.Field));
+            for (size_t c = 0; c < columns.size(); ++c) {
+                const std::string& field = columns[c].Field;
+                if (!field.empty() && source_->fieldIndex(field) >= 0)
+                    row.cells.push_back(source_->value(field));
+                else if (computed[c])
+                    row.cells.push_back(grid.fetchData(source_->bookmark(), columns[c].Key));
                 else
                     row.cells.push_back(Variant::null());
             }
@@ -253,6 +260,9 @@ public:
     std::vector<GridInfo> grids() override {
         std::vector<GridInfo> out;
         for (fw::GridExtender* g : gridExtenders()) {
+            // A form's grid with nothing bound stands for a choice the
+            // record does not make (several values where one is chosen).
+            if (editableGrids() && !g->Rows()) continue;
             GridInfo info;
             info.name = g->GridName();
             for (const ColumnDecl& c : g->Columns()) {

@@ -8,7 +8,9 @@
 //    the library's lists as navigation (those the library cannot make yet
 //    say so), the currency-rate list and its detail form over the real
 //    framework and service — a rate entered, saved and found in the list,
-//    Yes/No questions answered, and a closed tab's screens terminated;
+//    Yes/No questions answered, and a closed tab's screens terminated; and
+//    the partners' list and editor — a partner found with the quick filter,
+//    opened, changed and saved, a new one refused once and then saved;
 //  * the shell over its fixture screens (shell_fixture_server): a list of a
 //    million rows paged from the server, sorting, shortcuts, a detail form
 //    with its validation message, questions and input boxes as modal dialogs,
@@ -193,6 +195,93 @@ describe('pelta serve', () => {
     const output = await stopServer(server);
     server = null;
     assert.match(output, /library objects released: yes/);
+  });
+});
+
+describe('pelta serve: partners', () => {
+  let work, server, browser, page;
+  before(async () => {
+    work = mkdtempSync(path.join(tmpdir(), 'pelta-partners-'));
+    server = await startServer(path.join(buildDir, 'bin/pelta'), ['serve', '--port', '0', '--web', webDir],
+      { PELTA_REGISTRY: path.join(work, 'registry.ini'), XDG_DATA_HOME: work, PELTA_LOG_FOLDER: path.join(work, 'logs') });
+    browser = await launchBrowser();
+    page = await browser.context.newPage();
+    await page.goto(server.url);
+    await page.locator('body[data-ready=true]').waitFor();
+  });
+  after(async () => {
+    await browser?.close();
+    if (server) await stopServer(server);
+    rmSync(work, { recursive: true, force: true });
+  });
+
+  const list = () => page.locator('section.screen[data-kind=list]');
+  const form = () => page.locator('section.screen[data-kind=detail]');
+  const footer = (n) => list().locator('.footer', { hasText: new RegExp(`Записи: ${n}$`) });
+  const search = () => list().locator('.quick-filter input[name^=filter-]');
+  const cell = (row, column) => list().locator(`.ag-row[row-index="${row}"] .ag-cell[col-id="${column}"]`);
+  const find = async (text) => {
+    await search().fill(text);
+    await search().press('Enter');
+  };
+  let name;
+
+  test('the partners\' list shows the demo partners and its quick filter', async () => {
+    await page.locator('#lists a[data-list="PeltaNom15.ctxContragents"]').click();
+    await footer(40).waitFor();
+    assert.equal(await page.locator('.tab.active').textContent(), 'Контрагенти');
+    assert.equal(await list().locator('.quick-filter .hint').textContent(),
+      "(префикс '/' за търсене по код, '//' за търсене по адрес и др.)");
+    assert.equal(await list().locator('.quick-filter .caption').textContent(), 'Търсене');
+    await cell(2, 'Name').waitFor();
+    await page.screenshot({ path: path.join(shotDir, 'pelta-partners.png') });
+  });
+
+  test('a partner is found with the quick filter, opened, changed and saved', async () => {
+    name = (await cell(2, 'Name').textContent()).trim();
+    assert.ok(name.length > 3, name);
+    await find(name);
+    await footer(1).waitFor();
+    await list().locator('.ag-row', { hasText: name }).first().dblclick();
+    await form().waitFor();
+    assert.equal(await form().locator('[data-control=txtName]').inputValue(), name);
+    await page.screenshot({ path: path.join(shotDir, 'pelta-partner-form.png'), fullPage: true });
+    await form().locator('[data-control=attPhone]').fill('+359 2 9876543');
+    await page.keyboard.press('Control+s');
+    await page.locator('#status', { hasText: 'Записано' }).waitFor();
+
+    await page.locator('.tab', { hasText: 'Контрагенти' }).click();
+    await footer(1).waitFor();
+    // The address search ("//") looks in the phones too: the saved one is found.
+    await find('//2 9876543');
+    await footer(1).waitFor();
+    await list().locator('.ag-row', { hasText: name }).waitFor();
+    await page.screenshot({ path: path.join(shotDir, 'pelta-partners-found.png') });
+  });
+
+  test('a new partner is refused once, then saved and found in the list', async () => {
+    await list().locator('.ag-row').first().click();
+    await page.keyboard.press('Control+n');
+    await form().waitFor();
+    const field = (name) => form().locator(`[data-control=${name}]`);
+    await field('txtAddress').fill('гр. Варна, ул. Тестова 1');
+    await page.keyboard.press('Control+s');
+    await answerDialog(page, 'Невалидно име', 'OK');
+    await field('txtName').fill('Браузър Тест ООД');
+    await field('txtBulstat').fill('203040500');
+    const persons = form().locator('.grid[data-grid=gePersons]');
+    await persons.locator('button[data-action=addrow]').click();
+    await persons.locator('tbody tr').last().locator('input[name=Name]').fill('Иван Тестов');
+    await page.screenshot({ path: path.join(shotDir, 'pelta-partner-new.png'), fullPage: true });
+    await page.keyboard.press('Control+s');
+    await page.locator('#status', { hasText: 'Записано' }).waitFor();
+
+    await page.locator('.tab', { hasText: 'Контрагенти' }).click();
+    await find('Браузър Тест');
+    await footer(1).waitFor();
+    await list().locator('.ag-row', { hasText: 'Браузър Тест ООД' }).waitFor();
+    await find('');
+    await footer(41).waitFor();
   });
 });
 

@@ -26,6 +26,8 @@ function cellFormatter(column) {
   };
 }
 
+const WIDEST = 320; // px a column takes at most when fitted to its texts
+
 export class ListGrid {
   // `screen` is the screen description; `grid` one of its grids.
   constructor(element, connection, screen, grid, callbacks = {}) {
@@ -34,12 +36,14 @@ export class ListGrid {
     this.name = grid.name;
     this.total = grid.rowCount;
     this.callbacks = callbacks;
+    this.element = element;
+    this.fixedWidths = grid.columns.filter((c) => c.width > 0).map((c) => c.key);
     const columns = grid.columns.map((c, i) => ({
       colId: c.key,
       headerName: c.caption || c.key,
       hide: !c.visible,
       width: c.width > 0 ? c.width : undefined,
-      flex: c.width > 0 ? undefined : 1,
+      minWidth: 48,
       sortable: true,
       valueGetter: (p) => (p.data ? p.data.cells[i] : undefined),
       valueFormatter: cellFormatter(c),
@@ -59,6 +63,9 @@ export class ListGrid {
       // The current row stays current while the focus is on a toolbar button.
       onCellFocused: (e) => this.remember(e.rowIndex),
       onRowClicked: (e) => this.remember(e.rowIndex),
+      // Once the first rows arrived, columns take the width of their texts;
+      // the rows fill the grid when that leaves room, else scroll sideways.
+      onFirstDataRendered: () => this.fit(),
       overlayNoRowsTemplate: '<span>Няма записи</span>',
     });
   }
@@ -77,6 +84,17 @@ export class ListGrid {
       params.failCallback();
       this.callbacks.onError?.(e);
     }
+  }
+
+  fit() {
+    const fixed = new Set(this.fixedWidths);
+    const columns = this.api.getAllDisplayedColumns().filter((c) => !fixed.has(c.getColId()));
+    if (!columns.length) return;
+    this.api.autoSizeColumns(columns);
+    const wide = columns.filter((c) => c.getActualWidth() > WIDEST);
+    if (wide.length) this.api.setColumnWidths(wide.map((c) => ({ key: c, newWidth: WIDEST })));
+    const total = this.api.getAllDisplayedColumns().reduce((sum, c) => sum + c.getActualWidth(), 0);
+    if (total < this.element.clientWidth - 20) this.api.sizeColumnsToFit();
   }
 
   remember(rowIndex) {

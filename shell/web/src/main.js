@@ -163,6 +163,14 @@ function render(screen) {
   for (const g of d.grids) {
     if (g.groups && g.groups.length > 1) screen.view.append(groupFilter(screen, g));
     if (g.filters && g.filters.length) screen.view.append(quickFilter(screen, g));
+    // A form's grid under the caption of the control it stands for.
+    const declared = d.kind === 'detail' && d.controls.find((c) => c.kind === 'grid' && c.name === g.name);
+    if (declared && declared.caption) {
+      const heading = document.createElement('h3');
+      heading.className = 'grid-caption';
+      heading.textContent = declared.caption;
+      screen.view.append(heading);
+    }
     const holder = document.createElement('div');
     holder.className = 'grid';
     holder.dataset.grid = g.name;
@@ -209,8 +217,8 @@ function groupFilter(screen, g) {
   return label;
 }
 
-// The grid's quick filter: a field per typed filter, the list's hint as its
-// prompt. Enter (or leaving the field) applies the text on the server.
+// The grid's quick filter: a field per typed filter and the list's hint.
+// Enter (or leaving the field) applies the text on the server.
 function quickFilter(screen, g) {
   const bar = document.createElement('div');
   bar.className = 'quick-filter';
@@ -224,7 +232,7 @@ function quickFilter(screen, g) {
     input.type = 'search';
     input.name = `filter-${f.id}`;
     input.value = f.text;
-    if (i === 0 && g.filterHint) input.placeholder = g.filterHint;
+    if (i === 0 && g.filterHint) input.title = g.filterHint; // also shown beside the fields
     input.setAttribute('aria-label', f.caption);
     let applied = f.text;
     const apply = async () => {

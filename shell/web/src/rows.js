@@ -52,7 +52,7 @@ export class RowsTable {
     const columns = this.grid.columns.map((c, i) => ({ ...c, index: i })).filter((c) => c.visible);
     for (const c of columns) {
       const th = document.createElement('th');
-      th.textContent = c.caption || c.key;
+      th.textContent = c.caption; // a column may be shown without a caption
       head.append(th);
     }
     const body = table.createTBody();
