@@ -2,6 +2,7 @@
 
 #include "framework/form_extender.h"
 #include "framework/services.h"
+#include "platform/automation/ascii.h"
 #include "platform/automation/error.h"
 #include "platform/data/propertybag.h"
 #include "platform/data/recordset.h"
@@ -11,17 +12,6 @@ namespace pelta::fw {
 using namespace PeltaNom15;
 
 namespace {
-
-bool sameAscii(const std::string& a, const std::string& b) {
-    if (a.size() != b.size()) return false;
-    for (size_t i = 0; i < a.size(); ++i) {
-        char x = a[i], y = b[i];
-        if (x >= 'A' && x <= 'Z') x = static_cast<char>(x - 'A' + 'a');
-        if (y >= 'A' && y <= 'Z') y = static_cast<char>(y - 'A' + 'a');
-        if (x != y) return false;
-    }
-    return true;
-}
 
 std::string textOf(const pelta::Variant& v) {
     if (v.isEmpty() || v.isNull() || v.isObject()) return {};
@@ -122,7 +112,7 @@ pelta::ObjectRef RecordDeletion::FindDetailForm(IFormExtender* ListForm) {
     auto site = ListForm->ClientSite();
     for (auto* form : services()->threadForms()) {
         if (form == ListForm || form->closed() || !form->owner()) continue;
-        if (!sameAscii(form->ObjectName(), detailClass)) continue;
+        if (!equalsNoCaseAscii(form->ObjectName(), detailClass)) continue;
         if (form->ClientSite().get() != site.get()) continue;
         return pelta::ObjectRef(form->owner());
     }

@@ -7,6 +7,7 @@
 #include "framework/form_extender.h"
 #include "framework/grid_extender.h"
 #include "framework/record_deletion.h"
+#include "platform/automation/ascii.h"
 #include "platform/automation/error.h"
 #include "platform/automation/registry.h"
 #include "platform/data/propertybag.h"
@@ -15,15 +16,7 @@ namespace pelta::fw {
 
 using namespace PeltaNom15;
 
-namespace {
-
-std::string lowerAscii(std::string s) {
-    for (auto& c : s)
-        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
-    return s;
-}
-
-}  // namespace
+namespace {}  // namespace
 
 // ---- HostLogger ---------------------------------------------------------------------
 

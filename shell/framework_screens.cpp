@@ -20,6 +20,7 @@
 #include "framework/user_agent.h"
 #include "library/contracts/Constants.h"
 #include "library/contracts/Public.h"
+#include "platform/automation/ascii.h"
 #include "platform/automation/error.h"
 #include "platform/data/recordset.h"
 #include "shell/user_agent.h"
@@ -51,17 +52,6 @@ Variant rowBookmark(const std::string& key) {
 }
 
 namespace {
-
-bool sameAscii(std::string_view a, std::string_view b) {
-    if (a.size() != b.size()) return false;
-    for (size_t i = 0; i < a.size(); ++i) {
-        char x = a[i], y = b[i];
-        if (x >= 'A' && x <= 'Z') x = static_cast<char>(x - 'A' + 'a');
-        if (y >= 'A' && y <= 'Z') y = static_cast<char>(y - 'A' + 'a');
-        if (x != y) return false;
-    }
-    return true;
-}
 
 std::string text(const Variant& v) {
     if (v.isEmpty() || v.isNull()) return {};
@@ -218,8 +208,9 @@ private:
         auto columns = grid.Columns();
         RecordsetRef view = grid.view();
         for (const SortKey& k : sort) {
-            auto c = std::find_if(columns.begin(), columns.end(),
-                                  [&](const ColumnDecl& d) { return sameAscii(d.Key, k.column); });
+            auto c = std::find_if(columns.begin(), columns.end(), [&](const ColumnDecl& d) {
+                return equalsNoCaseAscii(d.Key, k.column);
+            });
             if (c == columns.end() || c->Field.empty() || view->fieldIndex(c->Field) < 0)
                 refuse("The column " + k.column + " cannot be sorted");
             out += (out.empty() ? "" : ", ") + c->Field + (k.descending ? " DESC" : " ASC");
@@ -362,7 +353,7 @@ protected:
 
     fw::GridExtender& gridNamed(const std::string& name) {
         for (fw::GridExtender* g : gridExtenders())
-            if (name.empty() || sameAscii(g->GridName(), name)) return *g;
+            if (name.empty() || equalsNoCaseAscii(g->GridName(), name)) return *g;
         refuse("No grid " + name);
     }
 

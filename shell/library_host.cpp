@@ -42,10 +42,8 @@ void terminateObject(pelta::Object* o) {
 // comes from its form extender).
 std::string knownCaption(const std::string& objectName) {
     static const std::pair<const char*, const char*> kCaptions[] = {
-        {"ctxRatios", "Валутни курсове"},
-        {"ctxContragents", "Контрагенти"},
-        {"ctxItems", "Продукти и материали"},
-        {"ctxItemsReserved", "Запазени количества"},
+        {"ctxRatios", "Валутни курсове"},     {"ctxContragents", "Контрагенти"},
+        {"ctxItems", "Продукти и материали"}, {"ctxItemsReserved", "Запазени количества"},
         {"ctxLocks", "Работни периоди"},
     };
     for (const auto& [name, caption] : kCaptions)

@@ -4,18 +4,12 @@
 #include <map>
 
 #include "library/frame/mdNomGlobals.h"
+#include "platform/automation/ascii.h"
 #include "platform/automation/error.h"
 
 namespace PeltaNom15 {
 
 namespace {
-
-std::string lowerAscii(std::string_view s) {
-    std::string r(s);
-    for (char& c : r)
-        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
-    return r;
-}
 
 // Never destroyed: forms may still be released while the process exits.
 std::map<std::string, ClassCreator>& creators() {
@@ -64,7 +58,7 @@ pelta::Ref<LibForm> FormsCollection::Item(int32_t Index) const {
 }
 
 pelta::ObjectRef FormsCollection::Add(const std::string& ClassName) {
-    if (lowerAscii(ClassName).rfind("frm", 0) != 0) cannotCreate(ClassName);
+    if (pelta::lowerAscii(ClassName).rfind("frm", 0) != 0) cannotCreate(ClassName);
     auto form = pelta::queryRef<LibForm>(CreateRegisteredClass(ClassName));
     if (!form) cannotCreate(ClassName);
     form->Load();
@@ -72,7 +66,7 @@ pelta::ObjectRef FormsCollection::Add(const std::string& ClassName) {
 }
 
 ClassCreator RegisterFormClass(std::string_view ClassName, ClassCreator Creator) {
-    auto key = lowerAscii(ClassName);
+    auto key = pelta::lowerAscii(ClassName);
     auto& map = creators();
     ClassCreator previous;
     if (auto it = map.find(key); it != map.end()) {
@@ -84,12 +78,12 @@ ClassCreator RegisterFormClass(std::string_view ClassName, ClassCreator Creator)
 }
 
 bool IsClassRegistered(std::string_view ClassName) {
-    return creators().count(lowerAscii(ClassName)) != 0;
+    return creators().count(pelta::lowerAscii(ClassName)) != 0;
 }
 
 pelta::ObjectRef CreateRegisteredClass(std::string_view ClassName) {
     auto& map = creators();
-    auto it = map.find(lowerAscii(ClassName));
+    auto it = map.find(pelta::lowerAscii(ClassName));
     if (it == map.end()) cannotCreate(ClassName);
     pelta::ObjectRef o = it->second();
     if (!o) cannotCreate(ClassName);

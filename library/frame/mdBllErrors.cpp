@@ -5,6 +5,7 @@
 
 #include "library/contracts/Constants.h"
 #include "library/frame/mdGlobals.h"
+#include "platform/automation/ascii.h"
 
 namespace PeltaNom15 {
 
@@ -222,12 +223,6 @@ bool endsWith(std::string_view s, std::string_view e) {
     return s.size() >= e.size() && s.substr(s.size() - e.size()) == e;
 }
 
-std::string lowerAscii(std::string s) {
-    for (char& c : s)
-        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
-    return s;
-}
-
 std::string mainPhrase(std::string_view table, std::string_view caption) {
     bool withS = false;
     for (auto t : kWithSTables)
@@ -304,9 +299,9 @@ std::string BllTableName(const std::string& Table) {
     std::string name;
     for (char c : Table)
         if (c != '"') name += c;
-    if (lowerAscii(name.substr(0, 4)) == "dbo.") name.erase(0, 4);
+    if (pelta::lowerAscii(name.substr(0, 4)) == "dbo.") name.erase(0, 4);
     if (name.empty()) return "'" + std::string(kUnknown) + "'";
-    const std::string key = lowerAscii(name);
+    const std::string key = pelta::lowerAscii(name);
 
     if (key == "con_dimensions" || key == "con_dimsmulti")
         return Printf(kWithDims, std::string("Договори"));
@@ -344,7 +339,7 @@ BllMessage ComposeBllError(const BllErrorInfo& Error) {
     if (entry->Mode == 'S') {
         // Links from the table when the refused column is the key, else a
         // wrong link to the table.
-        const bool fromTable = lowerAscii(Error.Column) == "id";
+        const bool fromTable = pelta::lowerAscii(Error.Column) == "id";
         m.Text = fill(*texts[fromTable ? 0 : 1], Error, docText);
     } else if (entry->Mode == 'A') {
         const Text* chosen = nullptr;

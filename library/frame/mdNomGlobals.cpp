@@ -4,6 +4,7 @@
 #include <string_view>
 
 #include "library/frame/Forms.h"
+#include "platform/automation/ascii.h"
 
 namespace PeltaNom15 {
 
@@ -20,19 +21,12 @@ constexpr std::array<std::string_view, 16> kTable = {
     "arRepItemsReserved",    "arBomsCost",
 };
 
-std::string lower(std::string_view s) {
-    std::string r(s);
-    for (char& c : r)
-        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
-    return r;
-}
-
 }  // namespace
 
 pelta::ObjectRef FormDispatcherGetForm(const std::string& Name) {
-    const std::string name = lower(Name);
+    const std::string name = pelta::lowerAscii(Name);
     for (std::string_view entry : kTable) {
-        if (lower(entry) == name) return CreateRegisteredClass(entry);
+        if (pelta::lowerAscii(entry) == name) return CreateRegisteredClass(entry);
     }
     return {};
 }

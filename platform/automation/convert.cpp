@@ -29,6 +29,7 @@
 #include <unicode/unistr.h>
 #include <unicode/ustring.h>
 
+#include "platform/automation/ascii.h"
 #include "platform/automation/error.h"
 #include "platform/automation/variant.h"
 
@@ -59,14 +60,7 @@ std::string_view trim(std::string_view s) noexcept {
 }
 
 bool equalsNoCase(std::string_view a, std::string_view b) noexcept {
-    if (a.size() != b.size()) return false;
-    for (size_t i = 0; i < a.size(); ++i) {
-        char x = a[i], y = b[i];
-        if (x >= 'A' && x <= 'Z') x = static_cast<char>(x - 'A' + 'a');
-        if (y >= 'A' && y <= 'Z') y = static_cast<char>(y - 'A' + 'a');
-        if (x != y) return false;
-    }
-    return true;
+    return equalsNoCaseAscii(a, b);
 }
 
 // --- numeric text ------------------------------------------------------------
@@ -317,9 +311,7 @@ int compareText(std::string_view a, std::string_view b, bool ignoreCase) {
     if (isAscii(a) && isAscii(b)) {
         size_t n = std::min(a.size(), b.size());
         for (size_t i = 0; i < n; ++i) {
-            char x = a[i], y = b[i];
-            if (x >= 'A' && x <= 'Z') x = static_cast<char>(x - 'A' + 'a');
-            if (y >= 'A' && y <= 'Z') y = static_cast<char>(y - 'A' + 'a');
+            const char x = lowerAscii(a[i]), y = lowerAscii(b[i]);
             if (x != y) return x < y ? -1 : 1;
         }
         return order(a.size(), b.size());

@@ -6,6 +6,7 @@
 #include <memory>
 #include <typeinfo>
 
+#include "platform/automation/ascii.h"
 #include "platform/automation/error.h"
 #include "platform/automation/variant.h"
 
@@ -43,14 +44,7 @@ std::string Object::typeName() const {
 }
 
 bool memberIs(std::string_view member, std::string_view name) noexcept {
-    if (member.size() != name.size()) return false;
-    for (size_t i = 0; i < member.size(); ++i) {
-        char a = member[i], b = name[i];
-        if (a >= 'A' && a <= 'Z') a = static_cast<char>(a - 'A' + 'a');
-        if (b >= 'A' && b <= 'Z') b = static_cast<char>(b - 'A' + 'a');
-        if (a != b) return false;
-    }
-    return true;
+    return equalsNoCaseAscii(member, name);
 }
 
 Variant callByName(Object* o, std::string_view member, std::span<Variant> args) {

@@ -11,6 +11,7 @@
 #include <mutex>
 #include <sstream>
 
+#include "platform/automation/ascii.h"
 #include "platform/automation/error.h"
 #include "platform/automation/variant.h"
 
@@ -19,13 +20,6 @@ namespace pelta {
 namespace fs = std::filesystem;
 
 namespace {
-
-std::string lowerAscii(std::string_view s) {
-    std::string r(s);
-    for (auto& c : r)
-        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
-    return r;
-}
 
 std::string trim(std::string_view s) {
     size_t b = s.find_first_not_of(" \t\r");
