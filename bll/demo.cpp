@@ -5,6 +5,7 @@
 #include <random>
 
 #include "bll/database.h"
+#include "bll/demo_items.h"
 #include "bll/service.h"
 #include "platform/automation/guid.h"
 
@@ -190,6 +191,7 @@ void generateDemo(Database& db, const DemoOptions& o) {
     put("DefVatPriceScale", "2");
     put("DefItmDimensionName", "Дименсии на продукти");
     put("DefCgDimensionName", "Дименсии на контрагенти");
+    generateDemoItems(db, DemoItemsContext{currencyIds}, std::clamp(o.items, 0, 1000000), o.seed);
     tx.commit();
 }
 

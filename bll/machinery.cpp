@@ -167,6 +167,7 @@ const OperationRegistry& operations() {
         OperationRegistry r;
         registerSecurityOperations(r);
         registerCurrencyOperations(r);
+        registerItemOperations(r);
         return r;
     }();
     return registry;

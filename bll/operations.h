@@ -90,6 +90,7 @@ const OperationRegistry& operations();
 // Registration by area (one function per source file).
 void registerSecurityOperations(OperationRegistry& r);
 void registerCurrencyOperations(OperationRegistry& r);
+void registerItemOperations(OperationRegistry& r);
 
 // --- Lists ---------------------------------------------------------------
 

@@ -1,5 +1,5 @@
 // pelta-demo: creates a demo database file.
-//   pelta-demo FILE [--banks N] [--days N] [--currencies N] [--seed N]
+//   pelta-demo FILE [--banks N] [--days N] [--currencies N] [--items N] [--seed N]
 #include <cstdlib>
 #include <cstring>
 #include <iostream>
@@ -11,7 +11,8 @@
 namespace {
 
 int usage() {
-    std::cerr << "usage: pelta-demo FILE [--banks N] [--days N] [--currencies N] [--seed N]\n";
+    std::cerr << "usage: pelta-demo FILE [--banks N] [--days N] [--currencies N] [--items N] "
+                 "[--seed N]\n";
     return 2;
 }
 
@@ -35,6 +36,8 @@ int main(int argc, char** argv) {
             o.rateDays = static_cast<int>(v);
         else if (std::strcmp(argv[i], "--currencies") == 0)
             o.currenciesPerRate = static_cast<int>(v);
+        else if (std::strcmp(argv[i], "--items") == 0 && v <= 1000000)
+            o.items = static_cast<int>(v);
         else if (std::strcmp(argv[i], "--seed") == 0)
             o.seed = static_cast<uint64_t>(v);
         else

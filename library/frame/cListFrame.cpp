@@ -20,9 +20,13 @@ cListFrame::cListFrame(ListDefinition Def) : m_oDef(std::move(Def)) {
     mdErrorHandling::DebugInstanceInit(m_oDef.ObjectName, m_lInstanceID, this);
 }
 
-cListFrame::~cListFrame() { mdErrorHandling::DebugInstanceTerm(m_oDef.ObjectName, m_lInstanceID); }
+cListFrame::~cListFrame() {
+    mdErrorHandling::DebugInstanceTerm(m_oDef.ObjectName, m_lInstanceID);
+}
 
-RecordsetRef cListFrame::ListRecordset() const { return m_rsList; }
+RecordsetRef cListFrame::ListRecordset() const {
+    return m_rsList;
+}
 
 bool cListFrame::InitClientSite(IClientSite* Site) {
     if (m_oForm) return true;  // initialised once; later calls come from hosts reusing the control
@@ -102,26 +106,32 @@ void cListFrame::m_oForm_Fetch(int32_t Step, bool& Cancel) {
             Cancel = true;
             return;
         }
-        auto list = RecordsetProperty(response.get(), m_oDef.ListProperty);
-        if (!list) {
-            Cancel = true;
-            return;
-        }
-        m_rsList = list;
+        if (!pvReadFetchResponse(*response)) Cancel = true;
     } catch (...) {
         Cancel = true;
         ShowError("m_oForm_Fetch", m_oDef.ObjectName, m_oDef.Caption);
     }
 }
 
+bool cListFrame::pvReadFetchResponse(pelta::PropertyBag& Response) {
+    auto list = RecordsetProperty(&Response, m_oDef.ListProperty);
+    if (!list) return false;
+    m_rsList = list;
+    return true;
+}
+
+void cListFrame::pvBindList() {
+    if (!m_rsList) return;
+    if (m_oDef.GroupColumn.empty())
+        m_oGridExt->Bind(m_rsList);
+    else
+        m_oGridExt->Bind(m_rsList, m_oDef.GroupColumn, pelta::Variant(m_oDef.GroupValue));
+    m_oGridExt->Refresh();
+}
+
 void cListFrame::m_oForm_FillControls() {
     try {
-        if (!m_rsList) return;
-        if (m_oDef.GroupColumn.empty())
-            m_oGridExt->Bind(m_rsList);
-        else
-            m_oGridExt->Bind(m_rsList, m_oDef.GroupColumn, pelta::Variant(m_oDef.GroupValue));
-        m_oGridExt->Refresh();
+        pvBindList();
     } catch (...) {
         PrintError("m_oForm_FillControls", m_oDef.ObjectName);
     }
@@ -129,6 +139,11 @@ void cListFrame::m_oForm_FillControls() {
 
 void cListFrame::m_oForm_BeforeExecute(int32_t CommandID, bool& Handled) {
     try {
+        // The list's own commands first: it may perform a frame command its way.
+        if (pvExecute(CommandID)) {
+            Handled = true;
+            return;
+        }
         switch (CommandID) {
             case kCmdNew:
                 Handled = true;
@@ -150,7 +165,6 @@ void cListFrame::m_oForm_BeforeExecute(int32_t CommandID, bool& Handled) {
                 m_oForm->Refresh();
                 break;
             default:
-                Handled = pvExecute(CommandID);
                 break;
         }
     } catch (...) {
@@ -191,9 +205,9 @@ void cListFrame::pvDeleteInactive() {
     if (m_oForm->MsgBox(kAskDeleteInactive, vbYesNo | vbQuestion) != vbYes) return;
     auto services = FrameworkServices();
     if (!services || !services->RecordDeletion()) return;
-    services->RecordDeletion()->DeleteRecords(m_oConnection.get(), m_oGridExt.get(),
-                                              m_oForm.get(), kBllCallKind,
-                                              m_oDef.DeleteOperation, m_oDef.KeyField, true);
+    services->RecordDeletion()->DeleteRecords(m_oConnection.get(), m_oGridExt.get(), m_oForm.get(),
+                                              kBllCallKind, m_oDef.DeleteOperation, m_oDef.KeyField,
+                                              true);
 }
 
 void cListFrame::pvMergeListRow(const RecordsetRef& Row) {

@@ -67,7 +67,12 @@ protected:
     virtual void pvInitList() {}
     // Parameters of the read operation.
     virtual void pvWriteFetchRequest(pelta::PropertyBag& Request) {}
-    // Commands of the list beyond the frame's; true when performed.
+    // Takes what the read operation answered; false cancels the fetch. The
+    // frame keeps the list property as the list recordset.
+    virtual bool pvReadFetchResponse(pelta::PropertyBag& Response);
+    // Binds the list recordset to the grid (Fill).
+    virtual void pvBindList();
+    // Commands of the list, asked before the frame's own; true when performed.
     virtual bool pvExecute(int32_t CommandID) { return false; }
     // The grid's own delete. Lists whose records may not be deleted that way
     // refuse it (the default); others delete through their operation.
