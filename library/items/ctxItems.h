@@ -58,6 +58,7 @@ public:
     IFilterBandExtender* StoreBand() const noexcept { return m_oStoreExt.get(); }
     IFilterBandExtender* DiscountsBand() const noexcept { return m_oDiscountsExt.get(); }
     ICacheDefExtender* CacheDef() const noexcept { return m_oCacheDef.get(); }
+    IFieldExtender* PreviewNote() const noexcept { return m_oNoteExt.get(); }
     // The selection state in use.
     const cItemsSelection& Selection() const noexcept { return m_oSel; }
     // The preview pane's markup and subtitle of the current row.
