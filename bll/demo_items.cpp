@@ -241,7 +241,7 @@ void generateDemoItems(Database& db, const DemoItemsContext& c, int count, uint6
             measures = {measure[kKilogram]};
             prefixes = {barcodePrefix(templ)};
         } else {
-            const std::string box = "0" + ean.substr(0, 11);
+            const std::string box = "390" + digits(static_cast<uint64_t>(n), 9);
             codes = {ean + eanCheck(ean), box + eanCheck(box)};
             measures = {measure[base], measure[kBox]};
         }
