@@ -3,6 +3,7 @@
 // generating cost centres.
 #include <algorithm>
 
+#include "bll/columnar.h"
 #include "bll/items.h"
 #include "bll/operations.h"
 #include "bll/service.h"
@@ -92,6 +93,14 @@ void answer(OperationContext& ctx, const char* name, std::string_view sql,
     ctx.response.writeProperty(name, Variant(readRecordset(ctx.db, sql, params, fields)));
 }
 
+// A set of a row or more per item: straight into the recordset's byte form.
+void answerRows(OperationContext& ctx, const char* name, std::string_view sql,
+                std::span<const Variant> params = {}, std::span<const FieldDef> fields = {}) {
+    if (!wants(ctx, name)) return;
+    ctx.response.writeProperty(name,
+                               Variant(ObjectRef(ColumnarRows::read(ctx.db, sql, params, fields))));
+}
+
 // The latest rate of every currency, national currency (the default one) at
 // 1 per 1 unless it has rates of its own.
 Ref<Recordset> currencyRatios(Database& db) {
@@ -131,15 +140,14 @@ void getNomItems(OperationContext& ctx) {
     const std::string schema = ctx.text("Discount_ID");
     ctx.response.writeProperty("PriceList_ID", Variant(plType));
 
-    if (wants(ctx, "List"))
-        ctx.response.writeProperty("List", Variant(readList(ctx.db, kItemsList)));
+    answerRows(ctx, "List", kItemsList.select + " ORDER BY " + kItemsList.orderBy);
 
     const FieldDef ratioFields[] = {guidField("ID")};
-    answer(ctx, "MeasureRatios",
-           "SELECT im.Itm_ID AS ID, im.Itm_ID, im.Measure_ID, m.Code AS MeasureCode, im.Ratio "
-           "FROM nom_itemsmeasures im JOIN nom_measures m ON m.ID = im.Measure_ID "
-           "ORDER BY im.Itm_ID, m.Code",
-           {}, ratioFields);
+    answerRows(ctx, "MeasureRatios",
+               "SELECT im.Itm_ID AS ID, im.Itm_ID, im.Measure_ID, m.Code AS MeasureCode, im.Ratio "
+               "FROM nom_itemsmeasures im JOIN nom_measures m ON m.ID = im.Measure_ID "
+               "ORDER BY im.Itm_ID, m.Code",
+               {}, ratioFields);
 
     {
         // Prices of the type, ordered by item, currency and measure, so that
@@ -147,16 +155,17 @@ void getNomItems(OperationContext& ctx) {
         const Variant params[] = {Variant(plType),
                                   owner.empty() ? Variant::null() : Variant(owner)};
         const FieldDef fields[] = {boolField("IsPromo"), guidField("PromoPlType_ID")};
-        answer(ctx, "PriceList",
-               "SELECT p.Itm_ID, p.Currency_ID, p.Measure_ID, p.BasePrice, p.BasePriceWithVat, "
-               "m.Code AS MeasureCode, c.Code AS CurrencyCode, p.PlType_ID, "
-               "t.IsPromo AS IsPromo, CASE WHEN t.IsPromo THEN p.PlType_ID END AS PromoPlType_ID "
-               "FROM nom_prices p JOIN nom_pricelisttypes t ON t.ID = p.PlType_ID "
-               "JOIN nom_measures m ON m.ID = p.Measure_ID "
-               "JOIN nom_currencies c ON c.ID = p.Currency_ID "
-               "WHERE p.PlType_ID = ?1 AND p.Cg_ID IS ?2 "
-               "ORDER BY p.Itm_ID, p.Currency_ID, p.Measure_ID",
-               params, fields);
+        answerRows(
+            ctx, "PriceList",
+            "SELECT p.Itm_ID, p.Currency_ID, p.Measure_ID, p.BasePrice, p.BasePriceWithVat, "
+            "m.Code AS MeasureCode, c.Code AS CurrencyCode, p.PlType_ID, "
+            "t.IsPromo AS IsPromo, CASE WHEN t.IsPromo THEN p.PlType_ID END AS PromoPlType_ID "
+            "FROM nom_prices p JOIN nom_pricelisttypes t ON t.ID = p.PlType_ID "
+            "JOIN nom_measures m ON m.ID = p.Measure_ID "
+            "JOIN nom_currencies c ON c.ID = p.Currency_ID "
+            "WHERE p.PlType_ID = ?1 AND p.Cg_ID IS ?2 "
+            "ORDER BY p.Itm_ID, p.Currency_ID, p.Measure_ID",
+            params, fields);
     }
 
     if (wants(ctx, "StoreSaldo")) {
@@ -171,31 +180,31 @@ void getNomItems(OperationContext& ctx) {
         };
         if (store.empty()) {
             // Every store: the sums per item.
-            answer(ctx, "StoreSaldo",
-                   "SELECT s.Itm_ID AS Itm_ID, i.Measure_ID AS Measure_ID, "
-                   "SUM(s.Quantity) AS Quantity, SUM(s.QuantityReserved) AS QuantityReserved, "
-                   "SUM(s.QuantitySecMeasure) AS QuantitySecMeasure, "
-                   "SUM(s.TotalSum) AS TotalSum, SUM(s.MinQuantity) AS MinQuantity "
-                   "FROM nom_storesaldo s JOIN nom_items i ON i.ID = s.Itm_ID "
-                   "GROUP BY s.Itm_ID ORDER BY s.Itm_ID",
-                   {}, fields);
+            answerRows(ctx, "StoreSaldo",
+                       "SELECT s.Itm_ID AS Itm_ID, i.Measure_ID AS Measure_ID, "
+                       "SUM(s.Quantity) AS Quantity, SUM(s.QuantityReserved) AS QuantityReserved, "
+                       "SUM(s.QuantitySecMeasure) AS QuantitySecMeasure, "
+                       "SUM(s.TotalSum) AS TotalSum, SUM(s.MinQuantity) AS MinQuantity "
+                       "FROM nom_storesaldo s JOIN nom_items i ON i.ID = s.Itm_ID "
+                       "GROUP BY s.Itm_ID ORDER BY s.Itm_ID",
+                       {}, fields);
         } else {
             const Variant params[] = {Variant(store)};
-            answer(ctx, "StoreSaldo",
-                   "SELECT s.Itm_ID AS Itm_ID, i.Measure_ID AS Measure_ID, s.Quantity, "
-                   "s.QuantityReserved, s.QuantitySecMeasure, s.TotalSum, s.MinQuantity, "
-                   "s.Store_ID FROM nom_storesaldo s JOIN nom_items i ON i.ID = s.Itm_ID "
-                   "WHERE s.Store_ID = ?1 ORDER BY s.Itm_ID",
-                   params, fields);
+            answerRows(ctx, "StoreSaldo",
+                       "SELECT s.Itm_ID AS Itm_ID, i.Measure_ID AS Measure_ID, s.Quantity, "
+                       "s.QuantityReserved, s.QuantitySecMeasure, s.TotalSum, s.MinQuantity, "
+                       "s.Store_ID FROM nom_storesaldo s JOIN nom_items i ON i.ID = s.Itm_ID "
+                       "WHERE s.Store_ID = ?1 ORDER BY s.Itm_ID",
+                       params, fields);
         }
     }
 
     {
         const Variant params[] = {Variant(schema)};
-        answer(ctx, "DiscountItems",
-               "SELECT Itm_ID, Discount FROM nom_discountitems WHERE Schema_ID = ?1 "
-               "ORDER BY Itm_ID",
-               params);
+        answerRows(ctx, "DiscountItems",
+                   "SELECT Itm_ID, Discount FROM nom_discountitems WHERE Schema_ID = ?1 "
+                   "ORDER BY Itm_ID",
+                   params);
     }
 
     if (wants(ctx, "CurrencyRatios"))

@@ -2,6 +2,8 @@
 // items, related items, bill-of-materials prices, cost centres, the code
 // lists kept on each item and the demo catalogue.
 #include "bll/items.h"
+#include "bll/columnar.h"
+#include "bll/operations.h"
 #include "bll_support.h"
 #include "platform/automation/guid.h"
 
@@ -210,6 +212,41 @@ TEST_F(ItemsBllTest, TheDemoCatalogueIsTheSameForTheSameSeed) {
                std::to_string(p->int64(1));
     };
     EXPECT_EQ(checksum(path_), checksum(other));
+}
+
+}  // namespace
+}  // namespace bll_test
+
+namespace bll_test {
+namespace {
+
+// The rows written straight into the byte form read back as the recordset
+// the ordinary reader makes: every field's shape and every value.
+TEST_F(ItemsBllTest, ColumnarRowsLoadAsTheSameRecordset) {
+    const std::string sql = pelta::bll::findList("ctxItems")->select + " ORDER BY i.Code";
+    auto expected = pelta::bll::readRecordset(admin_->database(), sql);
+    pelta::PropertyBag bag;
+    bag.writeProperty(
+        "List", Variant(pelta::ObjectRef(pelta::bll::ColumnarRows::read(admin_->database(), sql))));
+    auto back = pelta::PropertyBag::fromContents(bag.contents());
+    auto* got = pelta::query<pelta::Recordset>(back->readProperty("List").object());
+    ASSERT_NE(got, nullptr);
+    ASSERT_EQ(got->fieldCount(), expected->fieldCount());
+    ASSERT_EQ(got->recordCount(), expected->recordCount());
+    for (size_t f = 0; f < got->fieldCount(); ++f) {
+        EXPECT_EQ(got->fieldDef(f).name, expected->fieldDef(f).name);
+        EXPECT_EQ(got->fieldDef(f).type, expected->fieldDef(f).type) << got->fieldDef(f).name;
+    }
+    expected->moveFirst();
+    for (got->moveFirst(); !got->eof(); got->moveNext(), expected->moveNext())
+        for (size_t f = 0; f < got->fieldCount(); ++f)
+            ASSERT_TRUE(got->value(f) == expected->value(f)) << got->fieldDef(f).name;
+    // A second write of the same rows is refused rather than empty.
+    auto once = pelta::bll::ColumnarRows::read(admin_->database(), "SELECT ID FROM nom_items");
+    pelta::Bytes first;
+    pelta::ByteWriter w(first);
+    once->persist(w);
+    EXPECT_THROW(once->persist(w), pelta::Error);
 }
 
 }  // namespace
