@@ -20,6 +20,7 @@
 #include <random>
 
 #include "bll/database.h"
+#include "bll/operations.h"
 #include "bll/service.h"
 #include "framework/extenders.h"
 #include "framework/framework.h"
@@ -173,14 +174,12 @@ void BM_BareSqliteSameRows(benchmark::State& state) {
         "SELECT im.Itm_ID AS ID, im.Itm_ID, im.Measure_ID, m.Code AS MeasureCode, im.Ratio FROM "
         "nom_itemsmeasures im JOIN nom_measures m ON m.ID = im.Measure_ID ORDER BY im.Itm_ID, "
         "m.Code",
-        "SELECT p.Itm_ID, p.Currency_ID, p.Measure_ID, p.BasePrice, p.BasePriceWithVat, m.Code, "
-        "c.Code, p.PlType_ID, t.IsPromo, CASE WHEN t.IsPromo THEN p.PlType_ID END FROM nom_prices "
-        "p JOIN nom_pricelisttypes t ON t.ID = p.PlType_ID JOIN nom_measures m ON m.ID = "
-        "p.Measure_ID JOIN nom_currencies c ON c.ID = p.Currency_ID WHERE p.PlType_ID = '" +
+        "SELECT p.Itm_ID, p.Currency_ID, p.Measure_ID, p.BasePrice, p.BasePriceWithVat FROM "
+        "nom_prices p WHERE p.PlType_ID = '" +
             plType + "' AND p.Cg_ID IS NULL ORDER BY p.Itm_ID, p.Currency_ID, p.Measure_ID",
-        "SELECT s.Itm_ID, i.Measure_ID, SUM(s.Quantity), SUM(s.QuantityReserved), "
-        "SUM(s.QuantitySecMeasure), SUM(s.TotalSum), SUM(s.MinQuantity) FROM nom_storesaldo s "
-        "JOIN nom_items i ON i.ID = s.Itm_ID GROUP BY s.Itm_ID ORDER BY s.Itm_ID",
+        "SELECT s.Itm_ID, SUM(s.Quantity), SUM(s.QuantityReserved), SUM(s.QuantitySecMeasure), "
+        "SUM(s.TotalSum), SUM(s.MinQuantity) FROM nom_storesaldo s GROUP BY s.Itm_ID ORDER BY "
+        "s.Itm_ID",
     };
     double total = 0;
     int n = 0;

@@ -86,7 +86,9 @@ void generateDemoItems(Database& db, const DemoItemsContext& c, int count, uint6
     const ColumnType pct = ColumnType::parse("DECIMAL(9,4)").value();
     const Variant admin(kAdminId);
     const Variant stamp(makeDate(2024, 1, 1, 9, 0, 0));
-    db.execute("PRAGMA cache_size = -262144");
+    // Room for every page the catalogue touches, so that the one transaction
+    // never spills pages to the journal before it commits.
+    db.execute("PRAGMA cache_size = -3145728");
 
     std::array<std::string, std::size(kMeasures)> measure;
     {

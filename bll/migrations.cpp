@@ -246,6 +246,7 @@ CREATE TABLE nom_itemsmeasures (
     Ratio DECIMAL(18,6) NOT NULL CHECK (Ratio > 0),
     UNIQUE (Itm_ID, Measure_ID)
 );
+CREATE INDEX ix_nom_itemsmeasures_read ON nom_itemsmeasures (Itm_ID, Measure_ID, Ratio);
 
 CREATE TABLE nom_itemsbarcodes (
     ID GUID NOT NULL PRIMARY KEY,
@@ -307,6 +308,9 @@ CREATE TABLE nom_prices (
     LD DATETIME
 );
 CREATE UNIQUE INDEX ux_nom_prices ON nom_prices (PlType_ID, Cg_ID, Itm_ID, Currency_ID, Measure_ID);
+-- The prices of a type read in item order without visiting the table.
+CREATE INDEX ix_nom_prices_read
+    ON nom_prices (PlType_ID, Cg_ID, Itm_ID, Currency_ID, Measure_ID, BasePrice, BasePriceWithVat);
 CREATE INDEX ix_nom_prices_item ON nom_prices (Itm_ID);
 
 CREATE TABLE nom_storesaldo (
@@ -320,7 +324,11 @@ CREATE TABLE nom_storesaldo (
     MinQuantity DECIMAL(18,6),
     UNIQUE (Store_ID, Itm_ID)
 );
-CREATE INDEX ix_nom_storesaldo_item ON nom_storesaldo (Itm_ID);
+-- A store's quantities (and every store's sums) in item order from the index.
+CREATE INDEX ix_nom_storesaldo_read ON nom_storesaldo (Store_ID, Itm_ID, Quantity,
+    QuantityReserved, QuantitySecMeasure, TotalSum, MinQuantity);
+CREATE INDEX ix_nom_storesaldo_sums ON nom_storesaldo (Itm_ID, Quantity, QuantityReserved,
+    QuantitySecMeasure, TotalSum, MinQuantity);
 
 CREATE TABLE nom_discountschemas (
     ID GUID NOT NULL PRIMARY KEY,

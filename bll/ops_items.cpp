@@ -18,16 +18,16 @@ constexpr char kSep = '\x7F';
 
 // The list: every item with the names of what it refers to. The code lists
 // are kept on the item (see refreshItemCodeLists).
+// The list: every item with the names of what it refers to. The code lists
+// are kept on the item (see refreshItemCodeLists). What the detail form
+// alone shows (weights, duties, permits ...) stays out, so that a million
+// rows stay a few hundred megabytes.
 const ListDef kItemsList{
     "SELECT i.ID, i.Code, i.Name, i.Name2, i.BarCodes, i.BarPrefixes, i.BarMeasures, "
     "i.SupplCodes, i.SupplMeasures, i.Categories, i.ItmType_ID, t.Name AS ItemTypeName, "
-    "i.DimValue_ID, v.Name AS DimValueName, i.DefCurrency_ID, i.Measure_ID, "
-    "m.Code AS DefMeasureCode, i.SecMeasure_ID, sm.Code AS SecMeasureCode, i.IsVat, "
-    "i.IsVatAllowed, i.Vat, i.VatPriceScale, i.MinOrderQuo, i.WeightBruto, i.WeightNeto, "
-    "i.Excise, i.DutyTariffPrc, i.DutyTariffCode, i.Priority, i.Intrastat, i.IsRatePrice, "
-    "i.RatePrice, i.IsDma, i.IsAccPr, i.IsAccQuo, i.Permit, i.Concentration, "
-    "i.MarginalPriceVat, i.PriceGroup, i.Shelves, i.BomCount, i.ProjectCC_ID, "
-    "cc.Name AS ProjectName, i.IsActive, i.Note, i.CU, i.CD, i.LU, i.LD "
+    "v.Name AS DimValueName, i.DefCurrency_ID, i.Measure_ID, m.Code AS DefMeasureCode, "
+    "sm.Code AS SecMeasureCode, i.IsVat, i.IsVatAllowed, i.Vat, i.BomCount, "
+    "cc.Name AS ProjectName, i.IsActive, i.Note, i.CD, i.LD "
     "FROM nom_items i "
     "LEFT JOIN nom_itemtypes t ON t.ID = i.ItmType_ID "
     "LEFT JOIN nom_dimvalues v ON v.ID = i.DimValue_ID "
@@ -49,13 +49,6 @@ FieldDef guidField(const char* name) {
     FieldDef f;
     f.name = name;
     f.type = FieldType::Guid;
-    return f;
-}
-
-FieldDef boolField(const char* name) {
-    FieldDef f;
-    f.name = name;
-    f.type = FieldType::Boolean;
     return f;
 }
 
@@ -151,27 +144,21 @@ void getNomItems(OperationContext& ctx) {
 
     {
         // Prices of the type, ordered by item, currency and measure, so that
-        // the rows of one item are together.
+        // the rows of one item are together. The codes of currencies and
+        // measures and the type's promotion flag are in the reference sets.
         const Variant params[] = {Variant(plType),
                                   owner.empty() ? Variant::null() : Variant(owner)};
-        const FieldDef fields[] = {boolField("IsPromo"), guidField("PromoPlType_ID")};
-        answerRows(
-            ctx, "PriceList",
-            "SELECT p.Itm_ID, p.Currency_ID, p.Measure_ID, p.BasePrice, p.BasePriceWithVat, "
-            "m.Code AS MeasureCode, c.Code AS CurrencyCode, p.PlType_ID, "
-            "t.IsPromo AS IsPromo, CASE WHEN t.IsPromo THEN p.PlType_ID END AS PromoPlType_ID "
-            "FROM nom_prices p JOIN nom_pricelisttypes t ON t.ID = p.PlType_ID "
-            "JOIN nom_measures m ON m.ID = p.Measure_ID "
-            "JOIN nom_currencies c ON c.ID = p.Currency_ID "
-            "WHERE p.PlType_ID = ?1 AND p.Cg_ID IS ?2 "
-            "ORDER BY p.Itm_ID, p.Currency_ID, p.Measure_ID",
-            params, fields);
+        answerRows(ctx, "PriceList",
+                   "SELECT p.Itm_ID, p.Currency_ID, p.Measure_ID, p.BasePrice, "
+                   "p.BasePriceWithVat FROM nom_prices p "
+                   "WHERE p.PlType_ID = ?1 AND p.Cg_ID IS ?2 "
+                   "ORDER BY p.Itm_ID, p.Currency_ID, p.Measure_ID",
+                   params);
     }
 
     if (wants(ctx, "StoreSaldo")) {
         const FieldDef fields[] = {
             guidField("Itm_ID"),
-            guidField("Measure_ID"),
             decimalField("Quantity", 18, 6),
             decimalField("QuantityReserved", 18, 6),
             decimalField("QuantitySecMeasure", 18, 6),
@@ -181,20 +168,18 @@ void getNomItems(OperationContext& ctx) {
         if (store.empty()) {
             // Every store: the sums per item.
             answerRows(ctx, "StoreSaldo",
-                       "SELECT s.Itm_ID AS Itm_ID, i.Measure_ID AS Measure_ID, "
-                       "SUM(s.Quantity) AS Quantity, SUM(s.QuantityReserved) AS QuantityReserved, "
+                       "SELECT s.Itm_ID AS Itm_ID, SUM(s.Quantity) AS Quantity, "
+                       "SUM(s.QuantityReserved) AS QuantityReserved, "
                        "SUM(s.QuantitySecMeasure) AS QuantitySecMeasure, "
                        "SUM(s.TotalSum) AS TotalSum, SUM(s.MinQuantity) AS MinQuantity "
-                       "FROM nom_storesaldo s JOIN nom_items i ON i.ID = s.Itm_ID "
-                       "GROUP BY s.Itm_ID ORDER BY s.Itm_ID",
+                       "FROM nom_storesaldo s GROUP BY s.Itm_ID ORDER BY s.Itm_ID",
                        {}, fields);
         } else {
             const Variant params[] = {Variant(store)};
             answerRows(ctx, "StoreSaldo",
-                       "SELECT s.Itm_ID AS Itm_ID, i.Measure_ID AS Measure_ID, s.Quantity, "
-                       "s.QuantityReserved, s.QuantitySecMeasure, s.TotalSum, s.MinQuantity, "
-                       "s.Store_ID FROM nom_storesaldo s JOIN nom_items i ON i.ID = s.Itm_ID "
-                       "WHERE s.Store_ID = ?1 ORDER BY s.Itm_ID",
+                       "SELECT s.Itm_ID AS Itm_ID, s.Quantity, s.QuantityReserved, "
+                       "s.QuantitySecMeasure, s.TotalSum, s.MinQuantity, s.Store_ID "
+                       "FROM nom_storesaldo s WHERE s.Store_ID = ?1 ORDER BY s.Itm_ID",
                        params, fields);
         }
     }

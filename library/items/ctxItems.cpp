@@ -454,16 +454,62 @@ void ctxItems::Terminate() {
 
 // ---- fetch ------------------------------------------------------------------------------
 
+// The sets of a row or more per item come in calls of their own, so that
+// the bytes of one call are let go before the next arrives.
+static const std::vector<std::vector<std::string>>& PerItemCalls() {
+    static const std::vector<std::vector<std::string>> calls = {
+        {itemsets::PriceList},
+        {itemsets::MeasureRatios, itemsets::StoreSaldo, itemsets::DiscountItems},
+    };
+    return calls;
+}
+
 void ctxItems::pvWriteFetchRequest(pelta::PropertyBag& Request) {
     Request.writeProperty("PriceList", pelta::Variant(m_oSel.PriceListType));
     Request.writeProperty("CgOwner", pelta::Variant(m_oSel.Supplier));
     Request.writeProperty("StoreSaldoCgStore", pelta::Variant(m_oSel.Store));
     Request.writeProperty("Discount_ID", pelta::Variant(m_oSel.DiscountSchema));
     if (m_bFullRefresh) Request.writeProperty("FlushCache", pelta::Variant(true));
-    Request.writeProperty("Sets", pelta::Variant(Joined(m_oCacheDef->Missing(), ";")));
+    std::vector<std::string> sets;
+    for (const auto& name : m_oCacheDef->Missing()) {
+        bool later = false;
+        for (const auto& call : PerItemCalls())
+            if (std::find(call.begin(), call.end(), name) != call.end()) later = true;
+        if (!later) sets.push_back(name);
+    }
+    Request.writeProperty("Sets", pelta::Variant(Joined(sets, ";")));
+}
+
+bool ctxItems::pvFetchPerItemSets() {
+    const auto missing = m_oCacheDef->Missing();
+    for (const auto& call : PerItemCalls()) {
+        std::vector<std::string> sets;
+        for (const auto& name : call)
+            if (std::find(missing.begin(), missing.end(), name) != missing.end())
+                sets.push_back(name);
+        if (sets.empty()) continue;
+        auto request = CreatePropertyBag(m_oForm.get());
+        if (!request) return false;
+        pvWriteFetchRequest(*request);
+        request->writeProperty("Sets", pelta::Variant(Joined(sets, ";")));
+        auto response =
+            CallBll(m_oForm.get(), m_oConnection.get(), m_oDef.ReadOperation, request.get());
+        if (!response || !pvStoreSets(*response)) return false;
+    }
+    return true;
 }
 
 bool ctxItems::pvReadFetchResponse(pelta::PropertyBag& Response) {
+    if (!pvStoreSets(Response) || !pvFetchPerItemSets()) return false;
+    m_rsList = pelta::Ref<pelta::Recordset>(
+        pelta::query<pelta::Recordset>(m_oCacheDef->Item(itemsets::List).object()));
+    if (!m_rsList) return false;
+    m_bFullRefresh = false;
+    m_oForm->SetControlValue("lblInfo", pelta::Variant(""));
+    return true;
+}
+
+bool ctxItems::pvStoreSets(pelta::PropertyBag& Response) {
     if (const int32_t code = C2Lng(Response.readProperty("BllError")); code != 0) {
         if (code == 24) {
             // No right to the list: neither rows nor preview, only the note.
@@ -476,6 +522,8 @@ bool ctxItems::pvReadFetchResponse(pelta::PropertyBag& Response) {
         return false;
     }
     bool references = false;
+    if (Response.hasProperty("PriceList_ID"))
+        m_oSel.PriceListInUse = C2Str(Response.readProperty("PriceList_ID"));
     for (const auto& name : Response.names()) {
         auto rs = RecordsetProperty(&Response, name);
         if (!rs) continue;
@@ -496,15 +544,6 @@ bool ctxItems::pvReadFetchResponse(pelta::PropertyBag& Response) {
             references = true;
         }
     }
-    if (m_oSel.PriceListType.empty() && m_oPricesExt) {
-        // The default type the service used is what the list shows.
-        (void)Response.readProperty("PriceList_ID");
-    }
-    m_rsList = pelta::Ref<pelta::Recordset>(
-        pelta::query<pelta::Recordset>(m_oCacheDef->Item(itemsets::List).object()));
-    if (!m_rsList) return false;
-    m_bFullRefresh = false;
-    m_oForm->SetControlValue("lblInfo", pelta::Variant(""));
     if (references) pvFillFilterLists();
     return true;
 }

@@ -83,6 +83,10 @@ private:
     void pvInitCache();
     void pvReinit(IClientSite* Site);
     void pvFillFilterLists();
+    // Keeps the sets of a response in the cache; false on a refusal.
+    bool pvStoreSets(pelta::PropertyBag& Response);
+    // Fetches the per-item sets that are missing, a call per group.
+    bool pvFetchPerItemSets();
     // Drops cached sets and the indexes derived from them.
     void pvDropPrices();
     void pvDropComputedPrices();

@@ -161,6 +161,14 @@ std::vector<int64_t> cItemsPricing::ItemRows(const char* Set, const char* Index,
     return Derived<cPositions>(m_oCache, Index, set).Rows(ItemID);
 }
 
+std::string cItemsPricing::CodeOf(const char* Set, const std::string& ID) {
+    auto rs = CachedSet(m_oCache, Set);
+    if (!rs || ID.empty()) return {};
+    auto c = rs->clone();
+    if (c->recordCount() == 0 || !c->find("ID = '" + SqlQuote(ID) + "'")) return {};
+    return C2Str(c->value("Code"));
+}
+
 RecordsetRef cItemsPricing::SetAt(const char* Set, int64_t Position) {
     auto set = CachedSet(m_oCache, Set);
     if (!set) return {};
@@ -241,13 +249,6 @@ cItemPrice cItemsPricing::Price(const std::string& ItemID, const std::string& De
         auto rs = SetAt(itemsets::PriceList, source->position);
         auto price = DecimalOf(rs->value("BasePrice"));
         auto withVat = DecimalOf(rs->value("BasePriceWithVat"));
-        if (rs->fieldIndex("IsPromo") >= 0) out.IsPromo = C2Bool(rs->value("IsPromo"));
-        if (rs->fieldIndex("PromoPlType_ID") >= 0)
-            out.PromoType = C2Str(rs->value("PromoPlType_ID"));
-        if (best == 5) {
-            out.MeasureCode = C2Str(rs->value("MeasureCode"));
-            out.CurrencyCode = C2Str(rs->value("CurrencyCode"));
-        }
         bool ok = price.has_value();
         Decimal factor(1);
         if (ok && !SameKey(source->measure, wantMeas)) {
@@ -271,17 +272,17 @@ cItemPrice cItemsPricing::Price(const std::string& ItemID, const std::string& De
                         : (out.Price * (Decimal(1) + Vat / Decimal(100))).round(kPriceScale);
         }
     }
-    if (out.MeasureCode.empty() || out.CurrencyCode.empty()) {
-        // The codes of what the price is given in, from the reference lists.
-        auto code = [&](const char* set, const std::string& id) -> std::string {
-            auto rs = CachedSet(m_oCache, set);
-            if (!rs || id.empty()) return {};
-            auto c = rs->clone();
-            if (c->recordCount() == 0 || !c->find("ID = '" + SqlQuote(id) + "'")) return {};
-            return C2Str(c->value("Code"));
-        };
-        if (out.MeasureCode.empty()) out.MeasureCode = code("Measures", wantMeas);
-        if (out.CurrencyCode.empty()) out.CurrencyCode = code("Currencies", wantCur);
+    out.MeasureCode = CodeOf("Measures", wantMeas);
+    out.CurrencyCode = CodeOf("Currencies", wantCur);
+    // A promotional type marks its prices.
+    if (auto types = CachedSet(m_oCache, "PriceListType");
+        types && !m_oSel.PriceListInUse.empty()) {
+        auto t = types->clone();
+        if (t->recordCount() > 0 && t->find("ID = '" + SqlQuote(m_oSel.PriceListInUse) + "'") &&
+            C2Bool(t->value("IsPromo"))) {
+            out.IsPromo = true;
+            out.PromoType = m_oSel.PriceListInUse;
+        }
     }
     if (Measure.empty()) memo.Map.emplace(ItemID, out);
     return out;
@@ -345,9 +346,8 @@ std::string cItemsPricing::AdditionalPrices(const std::string& ItemID, const cIt
             continue;
         auto price = DecimalOf(rs->value("BasePriceWithVat"));
         if (!price) continue;
-        const std::string code = C2Str(rs->value("MeasureCode"));
-        const std::string entry =
-            FormatNumber(*price, 2, 8) + " " + C2Str(rs->value("CurrencyCode"));
+        const std::string code = CodeOf("Measures", meas);
+        const std::string entry = FormatNumber(*price, 2, 8) + " " + CodeOf("Currencies", cur);
         auto it = std::find_if(measures.begin(), measures.end(),
                                [&](const auto& m) { return m.first == code; });
         if (it == measures.end())

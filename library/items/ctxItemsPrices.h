@@ -42,6 +42,9 @@ struct cItemsSelection {
     std::string Supplier;       // owner of the supplier price list
     std::string DiscountSchema;
     std::string Store;  // empty: every store
+    // The type the service answered prices of (the default one when none
+    // was chosen).
+    std::string PriceListInUse;
 };
 
 // The quick find's findings for the item it identified.
@@ -120,6 +123,8 @@ public:
     // The 1-based positions in `Set` of the rows whose `Itm_ID` is `ItemID`
     // (the service orders every per-item set by item).
     std::vector<int64_t> ItemRows(const char* Set, const char* Index, const std::string& ItemID);
+    // The code of a currency or measure from its reference set.
+    std::string CodeOf(const char* Set, const std::string& ID);
     // A row of a cached set as a recordset standing on it.
     RecordsetRef SetAt(const char* Set, int64_t Position);
 
