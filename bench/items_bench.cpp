@@ -97,7 +97,8 @@ Host& host() {
 const std::vector<std::string>& computedColumns() {
     static const std::vector<std::string> columns = [] {
         std::vector<std::string> out;
-        for (const auto& c : pelta::makeRef<PeltaNom15::ctxItems>()->Definition().Columns)
+        const auto list = pelta::makeRef<PeltaNom15::ctxItems>();
+        for (const auto& c : list->Definition().Columns)
             if (c.Field.empty() || c.Field.rfind("Store", 0) == 0 || c.Field == "BasePrice" ||
                 c.Field == "BasePriceWithVat" || c.Field == "MeasureCode" ||
                 c.Field == "CurrencyCode" || c.Field == "Rate" || c.Field == "Discount")

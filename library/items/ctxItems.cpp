@@ -448,6 +448,7 @@ void ctxItems::Terminate() {
     m_oPricing.reset();
     m_oCacheDef.reset();
     m_rsSelection.reset();
+    m_rsReader.reset();
     m_oQuickFind->Invalidate();
     cListFrame::Terminate();
 }
@@ -534,6 +535,7 @@ bool ctxItems::pvStoreSets(pelta::PropertyBag& Response) {
         }
         if (name == itemsets::List) {
             m_oCacheDef->Drop(itemsets::ItemsCurrencyMeasure);
+            m_rsReader.reset();
             m_oQuickFind->Invalidate();
             m_vLastBookmark.clear();
         } else if (name == itemsets::PriceList || name == itemsets::MeasureRatios ||
@@ -649,7 +651,7 @@ std::vector<std::string> ctxItems::pvSelectedIDs(bool OnlyInactive) {
     auto marked = m_oGridExt->SelectedBookmarks();
     if (marked.empty() && m_oGridExt->HasCurrentRow())
         marked.push_back(m_oGridExt->CurrentBookmark());
-    auto rs = m_rsList->clone();
+    auto* rs = &pvReader();
     for (const auto& bookmark : marked) {
         try {
             rs->setBookmark(bookmark);
@@ -775,7 +777,7 @@ void ctxItems::pvUpdateCommands() {
     if (marked.empty() && m_oGridExt->HasCurrentRow())
         marked.push_back(m_oGridExt->CurrentBookmark());
     bool bom = false;
-    auto rs = m_rsList->clone();
+    auto* rs = &pvReader();
     for (const auto& b : marked) {
         try {
             rs->setBookmark(b);

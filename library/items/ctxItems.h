@@ -143,6 +143,8 @@ private:
     int32_t m_lPreviewTab = 0;
 
     std::unique_ptr<cItemsPricing> m_oPricing;
+    RecordsetRef m_rsReader;  // reads list rows by bookmark; made again per list
+    pelta::Recordset& pvReader();
     pelta::Variant m_vLastBookmark;  // the row m_oLastRow was computed for
     cItemRow m_oLastRow;
     std::unique_ptr<cItemsQuickFind> m_oQuickFind;

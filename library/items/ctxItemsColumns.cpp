@@ -31,6 +31,11 @@ std::string CurrencyShown(const std::string& Code) {
 
 }  // namespace
 
+pelta::Recordset& ctxItems::pvReader() {
+    if (!m_rsReader) m_rsReader = m_rsList->clone();
+    return *m_rsReader;
+}
+
 cItemsPricing& ctxItems::pvPricing() {
     return *m_oPricing;
 }
@@ -48,9 +53,9 @@ void ctxItems::m_oGridExt_FetchData(const pelta::Variant& Bookmark, const std::s
     Value = pelta::Variant();
     if (!m_rsList) return;
     if (Column == "BarCodes" || Column == "SupplCodes") {
-        auto rs = m_rsList->clone();
-        rs->setBookmark(Bookmark);
-        Value = pelta::Variant(ShowCodeList(C2Str(rs->value(Column))));
+        auto& rs = pvReader();
+        rs.setBookmark(Bookmark);
+        Value = pelta::Variant(ShowCodeList(C2Str(rs.value(Column))));
         return;
     }
     const cItemRow& r = pvRow(Bookmark);
@@ -89,9 +94,9 @@ void ctxItems::m_oGridExt_FetchData(const pelta::Variant& Bookmark, const std::s
         Value = price((p.Price * kept).round(8));
     } else if (Column == "PriceWithVatDiscount") {
         // The price without VAT, less the discount, plus the item's VAT.
-        auto rs = m_rsList->clone();
-        rs->setBookmark(Bookmark);
-        const Decimal vat = rs->value("Vat").isNull() ? Decimal() : rs->value("Vat").toDecimal();
+        auto& rs = pvReader();
+        rs.setBookmark(Bookmark);
+        const Decimal vat = rs.value("Vat").isNull() ? Decimal() : rs.value("Vat").toDecimal();
         Value = price((p.Price * kept * (Decimal(1) + vat / Decimal(100))).round(8));
     } else if (Column == "StoreSaldo") {
         Value = stock(s.Quantity);

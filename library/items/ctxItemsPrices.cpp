@@ -47,6 +47,12 @@ public:
         return m_oMemo.emplace(Item, std::move(rows)).first->second;
     }
 
+    // The set standing on a position (the index's own reader).
+    pelta::Recordset& At(int64_t Position) {
+        m_rs->setAbsolutePosition(Position);
+        return *m_rs;
+    }
+
 private:
     std::string Key(int64_t Position) {
         m_rs->setAbsolutePosition(Position);
@@ -67,10 +73,18 @@ public:
     std::unordered_map<std::string, std::optional<Decimal>> Memo;
 };
 
-// What the list row of an item gives the computations.
+// What the list row of an item gives the computations, by bookmark, with a
+// reader of the list that stays for as long as the list.
 struct cItemKeys {
     std::string ID, DefCurrency, Measure;
     Decimal Vat;
+};
+
+class cListKeys final : public pelta::Object {
+public:
+    explicit cListKeys(const RecordsetRef& List) : Reader(List->clone()) {}
+    RecordsetRef Reader;
+    std::unordered_map<int64_t, cItemKeys> Map;
 };
 
 template <class T, class... A>
@@ -169,12 +183,10 @@ std::string cItemsPricing::CodeOf(const char* Set, const std::string& ID) {
     return C2Str(c->value("Code"));
 }
 
-RecordsetRef cItemsPricing::SetAt(const char* Set, int64_t Position) {
+pelta::Recordset* cItemsPricing::SetAt(const char* Set, const char* Index, int64_t Position) {
     auto set = CachedSet(m_oCache, Set);
-    if (!set) return {};
-    auto rs = set->clone();
-    rs->setAbsolutePosition(Position);
-    return rs;
+    if (!set) return nullptr;
+    return &Derived<cPositions>(m_oCache, Index, set).At(Position);
 }
 
 std::optional<Decimal> cItemsPricing::CurrencyRate(const std::string& Currency) {
@@ -199,7 +211,7 @@ std::optional<Decimal> cItemsPricing::MeasureRatio(const std::string& ItemID,
                                                    const std::string& Measure) {
     if (Measure.empty() || SameKey(Measure, BaseMeasure)) return Decimal(1);
     for (int64_t p : ItemRows(itemsets::MeasureRatios, itemsets::MeasureRatiosBmks, ItemID)) {
-        auto rs = SetAt(itemsets::MeasureRatios, p);
+        auto rs = SetAt(itemsets::MeasureRatios, itemsets::MeasureRatiosBmks, p);
         if (!SameKey(C2Str(rs->value("Measure_ID")), Measure)) continue;
         auto ratio = DecimalOf(rs->value("Ratio"));
         if (!ratio || ratio->isZero()) return std::nullopt;
@@ -229,7 +241,7 @@ cItemPrice cItemsPricing::Price(const std::string& ItemID, const std::string& De
     };
     std::vector<Candidate> rows;
     for (int64_t p : ItemRows(itemsets::PriceList, itemsets::PriceListBmks, ItemID)) {
-        auto rs = SetAt(itemsets::PriceList, p);
+        auto rs = SetAt(itemsets::PriceList, itemsets::PriceListBmks, p);
         rows.push_back({p, C2Str(rs->value("Currency_ID")), C2Str(rs->value("Measure_ID"))});
     }
     // The row in the wanted currency and measure; else the nearest one to
@@ -246,7 +258,7 @@ cItemPrice cItemsPricing::Price(const std::string& ItemID, const std::string& De
         if (score > best) best = score, source = &c;
     }
     if (source) {
-        auto rs = SetAt(itemsets::PriceList, source->position);
+        auto rs = SetAt(itemsets::PriceList, itemsets::PriceListBmks, source->position);
         auto price = DecimalOf(rs->value("BasePrice"));
         auto withVat = DecimalOf(rs->value("BasePriceWithVat"));
         bool ok = price.has_value();
@@ -294,7 +306,7 @@ cItemStock cItemsPricing::Stock(const std::string& ItemID, const std::string& Ba
     cItemStock out;
     auto rows = ItemRows(itemsets::StoreSaldo, itemsets::StoreSaldoBmks, ItemID);
     if (rows.empty()) return out;
-    auto rs = SetAt(itemsets::StoreSaldo, rows.front());
+    auto rs = SetAt(itemsets::StoreSaldo, itemsets::StoreSaldoBmks, rows.front());
     out.Found = true;
     out.Quantity = DecimalOf(rs->value("Quantity")).value_or(Decimal());
     out.Reserved = DecimalOf(rs->value("QuantityReserved")).value_or(Decimal());
@@ -339,7 +351,7 @@ std::string cItemsPricing::AdditionalPrices(const std::string& ItemID, const cIt
     // currencies, each price with VAT and its currency code.
     std::vector<std::pair<std::string, std::string>> measures;  // code, text
     for (int64_t p : ItemRows(itemsets::PriceList, itemsets::PriceListBmks, ItemID)) {
-        auto rs = SetAt(itemsets::PriceList, p);
+        auto rs = SetAt(itemsets::PriceList, itemsets::PriceListBmks, p);
         const std::string cur = C2Str(rs->value("Currency_ID"));
         const std::string meas = C2Str(rs->value("Measure_ID"));
         if (Shown.Available && SameKey(cur, Shown.CurrencyID) && SameKey(meas, Shown.MeasureID))
@@ -363,13 +375,13 @@ std::string cItemsPricing::AdditionalPrices(const std::string& ItemID, const cIt
 }
 
 cItemRow cItemsPricing::Row(const pelta::Variant& Bookmark) {
-    auto& keys = Derived<cMemo<int64_t, cItemKeys>>(m_oCache, itemsets::ItemsCurrencyMeasure);
+    auto list = CachedSet(m_oCache, itemsets::List);
+    if (!list) return {};
+    auto& keys = Derived<cListKeys>(m_oCache, itemsets::ItemsCurrencyMeasure, list);
     const int64_t mark = static_cast<int64_t>(Bookmark.toDouble());
     auto it = keys.Map.find(mark);
     if (it == keys.Map.end()) {
-        auto list = CachedSet(m_oCache, itemsets::List);
-        if (!list) return {};
-        auto rs = list->clone();
+        auto& rs = keys.Reader;
         rs->setBookmark(Bookmark);
         cItemKeys k;
         k.ID = C2Str(rs->value("ID"));

@@ -125,8 +125,8 @@ public:
     std::vector<int64_t> ItemRows(const char* Set, const char* Index, const std::string& ItemID);
     // The code of a currency or measure from its reference set.
     std::string CodeOf(const char* Set, const std::string& ID);
-    // A row of a cached set as a recordset standing on it.
-    RecordsetRef SetAt(const char* Set, int64_t Position);
+    // A cached set standing on a position, through the reader of its index.
+    pelta::Recordset* SetAt(const char* Set, const char* Index, int64_t Position);
 
 private:
     ICacheDefExtender* m_oCache;

@@ -107,7 +107,7 @@ RecordsetRef ctxItems::pvBuildSelection(const std::vector<pelta::Variant>& Bookm
     rs->open();
     if (!m_rsList) return rs;
     const bool merge = m_oSite && C2Bool(m_oSite->Parameter("MergeItmCodeName"));
-    auto row = m_rsList->clone();
+    auto* row = &pvReader();
     for (const auto& bookmark : Bookmarks) {
         row->setBookmark(bookmark);
         rs->addNew();
