@@ -237,12 +237,14 @@ bool cItemsQuickFind::pvExactCode(const std::string& Value, pelta::Variant& Foun
 // value. The measure of the entry found goes with the item.
 bool cItemsQuickFind::pvCodeList(const char* Field, const char* Measures, const Index& Ix,
                                  const std::string& Value, pelta::Variant& Found,
-                                 cQuickFindState& State) {
+                                 cQuickFindState& State, CodeMatch Match) {
     auto whole = pvWhole(Ix, Field, Value);
     uint32_t row = 0, entry = 0;
-    if (whole.size() == 1) {
+    if (whole.size() == 1 && Match != CodeMatch::Inside) {
         row = whole.front().first;
         entry = whole.front().second;
+    } else if (whole.size() == 1 || (whole.empty() && Match == CodeMatch::Whole)) {
+        return false;
     } else if (whole.empty()) {
         auto rows = pvFilter(LikeClause(Field, Value, false));
         if (rows.size() != 1) return false;
@@ -310,9 +312,21 @@ bool cItemsQuickFind::Find(const RecordsetRef& List, const std::string& Text, pe
         ok = pvCodeList("SupplCodes", "SupplMeasures", m_oSupplCodes, Text.substr(3), Found, State);
     } else if (StartsWith(Text, "//")) {
         if (Text.size() < 3) return false;
+        // A whole barcode; a scale label that fits a weight template; a
+        // barcode that contains the value (the one search that reads every
+        // row comes last).
         const std::string value = Text.substr(2);
-        ok = pvCodeList("BarCodes", "BarMeasures", m_oBarCodes, value, Found, State);
-        if (!ok && AllDigits(value)) {
+        const bool whole = !pvWhole(m_oBarCodes, "BarCodes", value).empty();
+        ok = pvCodeList("BarCodes", "BarMeasures", m_oBarCodes, value, Found, State,
+                        CodeMatch::Whole);
+        if (!ok && !whole && AllDigits(value)) ok = pvWeight(value, Found, State);
+        if (!ok && !whole) {
+            State = {};
+            ok = pvCodeList("BarCodes", "BarMeasures", m_oBarCodes, value, Found, State,
+                            CodeMatch::Inside);
+        }
+        if (!ok && whole && AllDigits(value)) {
+            // Several items share the barcode: a weight template may still fit.
             State = {};
             ok = pvWeight(value, Found, State);
         }

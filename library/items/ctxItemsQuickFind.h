@@ -61,8 +61,12 @@ private:
                                                        const std::string& Value);
     // Rows matching a filter clause, at most `Limit` of them.
     std::vector<uint32_t> pvFilter(const std::string& Clause, size_t Limit = 2);
+    // Whole entries first, then (Any) entries that contain the value; or
+    // only one of the two.
+    enum class CodeMatch { Any, Whole, Inside };
     bool pvCodeList(const char* Field, const char* Measures, const Index& Ix,
-                    const std::string& Value, pelta::Variant& Found, cQuickFindState& State);
+                    const std::string& Value, pelta::Variant& Found, cQuickFindState& State,
+                    CodeMatch Match = CodeMatch::Any);
     bool pvWeight(const std::string& Digits, pelta::Variant& Found, cQuickFindState& State);
     bool pvExactCode(const std::string& Value, pelta::Variant& Found);
     bool pvOne(const std::vector<uint32_t>& Rows, pelta::Variant& Found);
