@@ -117,9 +117,9 @@ TEST_F(RatiosTest, NewRateIsSavedAndItsListRowRefreshed) {
     ASSERT_EQ(ratesOn(bank, day), 1);
     const std::string id = d->Key();
     // Rates are kept exactly, as integers of millionths.
-    EXPECT_EQ(
-        count("SELECT Rate FROM nom_currratiosdetails WHERE CurrRatio_ID = ?1", pelta::Variant(id)),
-        1812345);
+    EXPECT_EQ(count("SELECT Rate FROM nom_currratiosdetails WHERE CurrRatio_ID = ?1",
+                    pelta::Variant(id)),
+              1812345);
     EXPECT_EQ(scalar("SELECT CU FROM nom_currratios WHERE ID = ?1", pelta::Variant(id)).toString(),
               connection->CurrentUserID());
     // The list row came back with the answer: no second read of the list.
@@ -147,9 +147,9 @@ TEST_F(RatiosTest, ReopeningReusesTheDetailFormAndSavesChanges) {
     EXPECT_TRUE(g->editCell("Rate", pelta::Variant(*pelta::Decimal::parse("1.95"))));
     EXPECT_TRUE(g->commitRow());
     ASSERT_TRUE(again->FormExtender()->SaveDocument());
-    EXPECT_EQ(
-        count("SELECT Rate FROM nom_currratiosdetails WHERE CurrRatio_ID = ?1", pelta::Variant(id)),
-        1950000);
+    EXPECT_EQ(count("SELECT Rate FROM nom_currratiosdetails WHERE CurrRatio_ID = ?1",
+                    pelta::Variant(id)),
+              1950000);
 }
 
 TEST_F(RatiosTest, SaveWithoutBankIsRefusedWithoutCallingTheService) {

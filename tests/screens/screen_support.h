@@ -90,8 +90,8 @@ protected:
     }
 
     void connect(const std::string& user) {
-        connection =
-            pelta::makeRef<CountingConnection>(pelta::bll::Connection::open(dbFile_, user));
+        connection = pelta::makeRef<CountingConnection>(
+            pelta::bll::Connection::open(dbFile_, user));
         site = pelta::makeRef<pelta::fw::ClientSite>(connection);
     }
 
