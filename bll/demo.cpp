@@ -6,6 +6,7 @@
 
 #include "bll/database.h"
 #include "bll/demo_partners.h"
+#include "bll/demo_items.h"
 #include "bll/service.h"
 #include "platform/automation/guid.h"
 
@@ -192,6 +193,7 @@ void generateDemo(Database& db, const DemoOptions& o) {
     put("DefItmDimensionName", "Дименсии на продукти");
     put("DefCgDimensionName", "Дименсии на контрагенти");
     generatePartnersDemo(db, o);
+    generateDemoItems(db, DemoItemsContext{currencyIds}, std::clamp(o.items, 0, 1000000), o.seed);
     tx.commit();
 }
 

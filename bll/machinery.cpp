@@ -168,6 +168,7 @@ const OperationRegistry& operations() {
         registerSecurityOperations(r);
         registerCurrencyOperations(r);
         registerPartnerOperations(r);
+        registerItemOperations(r);
         return r;
     }();
     return registry;

@@ -125,8 +125,227 @@ CREATE INDEX ix_nom_currratiosdetails_head ON nom_currratiosdetails (CurrRatio_I
 CREATE INDEX ix_nom_currratiosdetails_currency ON nom_currratiosdetails (Currency_ID);
 )sql";
 
-// Version 3 is kept for the items.
-//
+// Items and what the items list shows beside them: measures and each item's
+// ratios to its base measure, item types, dimensions and their values
+// (categories), stores with the items' balances, price-list types with the
+// prices of each type per item, currency and measure (optionally owned by a
+// supplier), discount schemas, barcodes, supplier codes, related items, bills
+// of materials and cost centres. The code lists of an item (`BarCodes`,
+// `BarPrefixes`, `BarMeasures`, `SupplCodes`, `SupplMeasures`, `Categories`)
+// are kept on the item by the service, each entry preceded by U+007F and the
+// last followed by it, so that the list reads them without aggregating a
+// million items' codes on every fetch.
+constexpr const char* kMigration3 = R"sql(
+CREATE TABLE nom_measures (
+    ID GUID NOT NULL PRIMARY KEY,
+    Code VARCHAR(20) NOT NULL UNIQUE,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+
+CREATE TABLE nom_itemtypes (
+    ID GUID NOT NULL PRIMARY KEY,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    IsActive BOOLEAN NOT NULL DEFAULT 1
+);
+
+CREATE TABLE nom_dimensions (
+    ID GUID NOT NULL PRIMARY KEY,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    IsActive BOOLEAN NOT NULL DEFAULT 1
+);
+
+CREATE TABLE nom_dimvalues (
+    ID GUID NOT NULL PRIMARY KEY,
+    Dimension_ID GUID NOT NULL REFERENCES nom_dimensions (ID) ON DELETE CASCADE,
+    Name VARCHAR(100) NOT NULL,
+    FullName VARCHAR(500) NOT NULL,
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    UNIQUE (Dimension_ID, FullName)
+);
+
+CREATE TABLE nom_stores (
+    ID GUID NOT NULL PRIMARY KEY,
+    Code VARCHAR(20) NOT NULL UNIQUE,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    IsActive BOOLEAN NOT NULL DEFAULT 1
+);
+
+CREATE TABLE nom_costcenters (
+    ID GUID NOT NULL PRIMARY KEY,
+    Type INTEGER NOT NULL,
+    Code VARCHAR(50) NOT NULL,
+    Name VARCHAR(250) NOT NULL,
+    Itm_ID GUID,
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME,
+    UNIQUE (Type, Code)
+);
+
+CREATE TABLE nom_items (
+    ID GUID NOT NULL PRIMARY KEY,
+    Code VARCHAR(50) NOT NULL UNIQUE,
+    Name VARCHAR(250) NOT NULL,
+    Name2 VARCHAR(250),
+    ItmType_ID GUID REFERENCES nom_itemtypes (ID),
+    DimValue_ID GUID REFERENCES nom_dimvalues (ID),
+    Measure_ID GUID NOT NULL REFERENCES nom_measures (ID),
+    SecMeasure_ID GUID REFERENCES nom_measures (ID),
+    DefCurrency_ID GUID REFERENCES nom_currencies (ID),
+    IsVat BOOLEAN NOT NULL DEFAULT 1,
+    IsVatAllowed BOOLEAN NOT NULL DEFAULT 1,
+    Vat DECIMAL(9,4) NOT NULL,
+    VatPriceScale INTEGER NOT NULL DEFAULT 2,
+    MinOrderQuo DECIMAL(18,6),
+    WeightBruto DECIMAL(18,6),
+    WeightNeto DECIMAL(18,6),
+    Excise DECIMAL(18,6),
+    DutyTariffPrc DECIMAL(9,4),
+    DutyTariffCode VARCHAR(20),
+    Priority INTEGER,
+    Intrastat VARCHAR(20),
+    IsRatePrice BOOLEAN NOT NULL DEFAULT 0,
+    RatePrice DECIMAL(18,8),
+    IsDma BOOLEAN NOT NULL DEFAULT 0,
+    IsAccPr BOOLEAN NOT NULL DEFAULT 0,
+    IsAccQuo BOOLEAN NOT NULL DEFAULT 0,
+    Permit VARCHAR(100),
+    Concentration VARCHAR(50),
+    MarginalPriceVat DECIMAL(18,8),
+    PriceGroup VARCHAR(50),
+    Shelves VARCHAR(100),
+    BomCount INTEGER NOT NULL DEFAULT 0,
+    ProjectCC_ID GUID REFERENCES nom_costcenters (ID) ON DELETE SET NULL,
+    Categories TEXT,
+    BarCodes TEXT,
+    BarPrefixes TEXT,
+    BarMeasures TEXT,
+    SupplCodes TEXT,
+    SupplMeasures TEXT,
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    Note VARCHAR(255),
+    NoteRtf LONGTEXT,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+CREATE INDEX ix_nom_items_name ON nom_items (Name);
+
+CREATE TABLE nom_itemsmeasures (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Measure_ID GUID NOT NULL REFERENCES nom_measures (ID),
+    Ratio DECIMAL(18,6) NOT NULL CHECK (Ratio > 0),
+    UNIQUE (Itm_ID, Measure_ID)
+);
+CREATE INDEX ix_nom_itemsmeasures_read ON nom_itemsmeasures (Itm_ID, Measure_ID, Ratio);
+
+CREATE TABLE nom_itemsbarcodes (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    BarCode VARCHAR(50) NOT NULL,
+    Measure_ID GUID REFERENCES nom_measures (ID)
+);
+CREATE INDEX ix_nom_itemsbarcodes_item ON nom_itemsbarcodes (Itm_ID);
+CREATE INDEX ix_nom_itemsbarcodes_code ON nom_itemsbarcodes (BarCode);
+
+CREATE TABLE nom_itemssupplcodes (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Cg_ID GUID,
+    Code VARCHAR(50) NOT NULL,
+    Measure_ID GUID REFERENCES nom_measures (ID)
+);
+CREATE INDEX ix_nom_itemssupplcodes_item ON nom_itemssupplcodes (Itm_ID);
+
+CREATE TABLE nom_itemssimilar (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    SimilarItm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Type INTEGER NOT NULL CHECK (Type IN (1, 2)),
+    UNIQUE (Itm_ID, SimilarItm_ID, Type)
+);
+CREATE INDEX ix_nom_itemssimilar_other ON nom_itemssimilar (SimilarItm_ID);
+
+CREATE TABLE nom_itemsboms (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Component_ID GUID NOT NULL REFERENCES nom_items (ID),
+    Quantity DECIMAL(18,6) NOT NULL CHECK (Quantity > 0)
+);
+CREATE INDEX ix_nom_itemsboms_item ON nom_itemsboms (Itm_ID);
+CREATE INDEX ix_nom_itemsboms_component ON nom_itemsboms (Component_ID);
+
+CREATE TABLE nom_pricelisttypes (
+    ID GUID NOT NULL PRIMARY KEY,
+    Code VARCHAR(20) NOT NULL UNIQUE,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    IsPromo BOOLEAN NOT NULL DEFAULT 0,
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+
+CREATE TABLE nom_prices (
+    ID GUID NOT NULL PRIMARY KEY,
+    PlType_ID GUID NOT NULL REFERENCES nom_pricelisttypes (ID) ON DELETE CASCADE,
+    Cg_ID GUID,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Currency_ID GUID NOT NULL REFERENCES nom_currencies (ID),
+    Measure_ID GUID NOT NULL REFERENCES nom_measures (ID),
+    BasePrice DECIMAL(18,8) NOT NULL,
+    BasePriceWithVat DECIMAL(18,8) NOT NULL,
+    LD DATETIME
+);
+CREATE UNIQUE INDEX ux_nom_prices ON nom_prices (PlType_ID, Cg_ID, Itm_ID, Currency_ID, Measure_ID);
+-- The prices of a type read in item order without visiting the table.
+CREATE INDEX ix_nom_prices_read
+    ON nom_prices (PlType_ID, Cg_ID, Itm_ID, Currency_ID, Measure_ID, BasePrice, BasePriceWithVat);
+CREATE INDEX ix_nom_prices_item ON nom_prices (Itm_ID);
+
+CREATE TABLE nom_storesaldo (
+    ID GUID NOT NULL PRIMARY KEY,
+    Store_ID GUID NOT NULL REFERENCES nom_stores (ID),
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Quantity DECIMAL(18,6) NOT NULL,
+    QuantityReserved DECIMAL(18,6) NOT NULL,
+    QuantitySecMeasure DECIMAL(18,6),
+    TotalSum DECIMAL(18,4) NOT NULL,
+    MinQuantity DECIMAL(18,6),
+    UNIQUE (Store_ID, Itm_ID)
+);
+-- A store's quantities (and every store's sums) in item order from the index.
+CREATE INDEX ix_nom_storesaldo_read ON nom_storesaldo (Store_ID, Itm_ID, Quantity,
+    QuantityReserved, QuantitySecMeasure, TotalSum, MinQuantity);
+CREATE INDEX ix_nom_storesaldo_sums ON nom_storesaldo (Itm_ID, Quantity, QuantityReserved,
+    QuantitySecMeasure, TotalSum, MinQuantity);
+
+CREATE TABLE nom_discountschemas (
+    ID GUID NOT NULL PRIMARY KEY,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    IsActive BOOLEAN NOT NULL DEFAULT 1
+);
+
+CREATE TABLE nom_discountitems (
+    ID GUID NOT NULL PRIMARY KEY,
+    Schema_ID GUID NOT NULL REFERENCES nom_discountschemas (ID) ON DELETE CASCADE,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Discount DECIMAL(9,4) NOT NULL,
+    UNIQUE (Schema_ID, Itm_ID)
+);
+CREATE INDEX ix_nom_discountitems_item ON nom_discountitems (Itm_ID);
+)sql";
+
 // Business partners with their persons, delivery addresses, bank accounts and
 // departments, the partner types, and the dimensions of partners with their
 // values. Price lists, discount schemes, bonus programmes, countries, cities
@@ -316,6 +535,7 @@ CREATE INDEX ix_nom_cgdimlinks_value ON nom_cgdimlinks (DimValue_ID);
 constexpr Migration kMigrations[] = {
     {1, "users, groups, rights and settings", kMigration1},
     {2, "currencies, banks and currency rates", kMigration2},
+    {3, "items, measures, stores, price lists, balances and discounts", kMigration3},
     {4, "business partners", kMigration4},
 };
 

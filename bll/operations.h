@@ -91,6 +91,7 @@ const OperationRegistry& operations();
 void registerSecurityOperations(OperationRegistry& r);
 void registerCurrencyOperations(OperationRegistry& r);
 void registerPartnerOperations(OperationRegistry& r);
+void registerItemOperations(OperationRegistry& r);
 
 // --- Lists ---------------------------------------------------------------
 

@@ -1,5 +1,6 @@
 // pelta-demo: creates a demo database file.
-//   pelta-demo FILE [--banks N] [--days N] [--currencies N] [--partners N] [--seed N]
+//   pelta-demo FILE [--banks N] [--days N] [--currencies N] [--partners N] [--items N]
+//              [--seed N]
 #include <cstdlib>
 #include <cstring>
 #include <iostream>
@@ -12,6 +13,7 @@ namespace {
 
 int usage() {
     std::cerr << "usage: pelta-demo FILE [--banks N] [--days N] [--currencies N] [--partners N] "
+                 "[--items N] "
                  "[--seed N]\n";
     return 2;
 }
@@ -38,6 +40,8 @@ int main(int argc, char** argv) {
             o.currenciesPerRate = static_cast<int>(v);
         else if (std::strcmp(argv[i], "--partners") == 0)
             o.partners = static_cast<int>(v);
+        else if (std::strcmp(argv[i], "--items") == 0 && v <= 1000000)
+            o.items = static_cast<int>(v);
         else if (std::strcmp(argv[i], "--seed") == 0)
             o.seed = static_cast<uint64_t>(v);
         else

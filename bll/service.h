@@ -96,11 +96,14 @@ struct DemoOptions {
     int rateDays = 30;          // days of rates per bank
     int currenciesPerRate = 4;  // rows per rate record (at most the currencies known)
     int partners = 40;          // business partners
+    int items = 40;             // items of the catalogue (0 to 1,000,000)
     uint64_t seed = 20240101;
 };
 // Fills an empty, migrated database: users `admin` (administrators) and
 // `operator` (may open currency rates, not change them), currencies, banks,
-// rates and the application parameters.
+// rates, the application parameters, and a catalogue of `items` items with
+// their measures, barcodes, supplier codes, prices, stock and discounts (see
+// demo_items.cpp). One transaction, prepared statements.
 void generateDemo(Database& db, const DemoOptions& options = {});
 // Creates the file at `path` (replacing nothing: raises when it exists) and
 // fills it with generateDemo.

@@ -6,6 +6,7 @@
 #include "framework/grid_extender.h"
 #include "framework/services.h"
 #include "platform/automation/error.h"
+#include "platform/data/recordset.h"
 
 namespace pelta::fw {
 
@@ -147,7 +148,21 @@ void QuickFilterExtender::AddField(int32_t FilterID, const std::string& Caption,
             f.fields = Fields;
             return;
         }
-    fields_.push_back(Field{FilterID, Caption, Fields, {}});
+    Field f;
+    f.id = FilterID;
+    f.caption = Caption;
+    f.fields = Fields;
+    fields_.push_back(std::move(f));
+}
+
+void QuickFilterExtender::SetFieldList(int32_t FilterID, RecordsetRef Rows,
+                                       const std::string& KeyField, const std::string& ShownField,
+                                       const std::string& FirstEntry) {
+    auto& f = fieldRef(FilterID);
+    f.listRows = std::move(Rows);
+    f.listKey = KeyField;
+    f.listShown = ShownField;
+    f.listFirst = FirstEntry;
 }
 
 void QuickFilterExtender::SetText(int32_t FilterID, const std::string& Text) {

@@ -9,6 +9,7 @@
 
 #include "framework/extender_base.h"
 #include "library/contracts/Extenders.h"
+#include "platform/data/recordset.h"
 
 namespace pelta::fw {
 
@@ -114,11 +115,19 @@ public:
     // clauses joined with AND become the grid's row filter.
     void Apply() override;
 
+    void SetFieldList(int32_t FilterID, RecordsetRef Rows, const std::string& KeyField,
+                      const std::string& ShownField, const std::string& FirstEntry) override;
+
     struct Field {
         int32_t id = 0;
         std::string caption;
         std::vector<std::string> fields;
         std::string text;
+        // A field chosen from rows (SetFieldList).
+        RecordsetRef listRows;
+        std::string listKey;
+        std::string listShown;
+        std::string listFirst;
     };
     const std::vector<Field>& fields() const noexcept { return fields_; }
     const std::string& hint() const noexcept { return hint_; }

@@ -354,6 +354,40 @@ bool FormExtender::InputBox(const std::string& Prompt, const std::string& Title,
     return true;
 }
 
+bool FormExtender::InputList(const std::string& Title, const std::string& Prompt,
+                             const std::vector<std::string>& Choices, int32_t& Choice) {
+    if (Choices.empty()) return false;
+    fw::Prompt p;
+    p.kind = PromptKind::InputBox;
+    p.text = Prompt;
+    p.caption = caption_;
+    p.title = Title;
+    for (const auto& c : Choices)
+        p.hint += (p.hint.empty() ? "" : "|") + c;
+    p.value = pelta::Variant(Choice);
+    auto answer = requireAgent(Prompt)->inputBox(p);
+    if (!answer) return false;
+    // The answer is a choice's number or its text.
+    int32_t chosen = 0;
+    if (answer->isString()) {
+        for (size_t i = 0; i < Choices.size(); ++i)
+            if (Choices[i] == answer->str()) chosen = static_cast<int32_t>(i + 1);
+    }
+    if (chosen == 0 && answer->isNumeric()) {
+        try {
+            chosen = answer->toLong();
+        } catch (const pelta::Error&) {
+            chosen = 0;
+        }
+    }
+    if (chosen < 1 || chosen > static_cast<int32_t>(Choices.size()))
+        pelta::raise(pelta::errc::InvalidProcedureCall,
+                     "The answer is not one of the choices of \"" + Prompt + "\"",
+                     "FormExtender.InputList");
+    Choice = chosen;
+    return true;
+}
+
 // ---- settings -----------------------------------------------------------------------
 
 pelta::Variant FormExtender::GetSetting(const std::string& Name, const pelta::Variant& Default) {

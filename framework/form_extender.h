@@ -98,6 +98,10 @@ public:
     int32_t AskYesNo(const std::string& Text, const std::string& Caption = {}) override;
     bool InputBox(const std::string& Prompt, const std::string& Title,
                   pelta::Variant& Value) override;
+    // An input box whose hint lists the choices joined by "|"; the answer is
+    // a choice's number or text (anything else raises InvalidProcedureCall).
+    bool InputList(const std::string& Title, const std::string& Prompt,
+                   const std::vector<std::string>& Choices, int32_t& Choice) override;
 
     // Kept under the layout key (the object name while no key is set).
     pelta::Variant GetSetting(const std::string& Name, const pelta::Variant& Default) override;

@@ -3,8 +3,10 @@
 #include "framework/extenders.h"
 #include "framework/form_extender.h"
 #include "framework/grid_extender.h"
+#include "framework/list_extenders.h"
 #include "framework/record_deletion.h"
 #include "framework/services.h"
+#include "framework/siblings.h"
 #include "platform/automation/registry.h"
 
 namespace pelta::fw {
@@ -36,6 +38,13 @@ const ClassOf kClasses[] = {
     {kProgIdPresetExtender, make<PresetExtender>},
     {kProgIdReportExtender, make<ReportExtender>},
     {kProgIdFieldExtender, make<FieldExtender>},
+    {kProgIdFilterBandExtender, make<FilterBandExtender>},
+    {kProgIdCacheDefExtender, make<CacheDefExtender>},
+    // Sibling libraries of the suite.
+    {kProgIdDmaDetails,
+     [] { return pelta::ObjectRef(pelta::makeRef<SiblingForm>(kProgIdDmaDetails)); }},
+    {kProgIdStoLedgerItem,
+     [] { return pelta::ObjectRef(pelta::makeRef<SiblingReport>(kProgIdStoLedgerItem)); }},
 };
 
 }  // namespace

@@ -123,6 +123,7 @@ void GridExtender::Bind(RecordsetRef Rows, const std::string& GroupColumn,
                      "The rows bound to " + gridName_ + " have no group column " + GroupColumn,
                      "GridExtender.Bind");
     rows_ = std::move(Rows);
+    reader_.reset();
     groupColumn_ = GroupColumn;
     groupValue_ = GroupValue;
     selected_.clear();
@@ -418,6 +419,51 @@ RowFormatArgs GridExtender::formatRow(const pelta::Variant& bookmark) {
     args.Bookmark = bookmark;
     raise(events_.RowFormat, args);
     return args;
+}
+
+pelta::Variant GridExtender::cellValue(const pelta::Variant& bookmark, const std::string& column) {
+    if (!view_)
+        pelta::raise(pelta::errc::ObjectVariableNotSet, "No rows are bound to " + gridName_,
+                     "GridExtender.cellValue");
+    if (!reader_ || !rows_) reader_ = view_->clone();
+    reader_->clearFilter();
+    try {
+        reader_->setBookmark(bookmark);
+    } catch (const pelta::Error&) {
+        pelta::raise(pelta::errc::InvalidProcedureCall,
+                     "The grid " + gridName_ + " has no row at that bookmark",
+                     "GridExtender.cellValue");
+    }
+    auto field = fieldOf(column);
+    if (!field.empty() && reader_->fieldIndex(field) >= 0) return reader_->value(field);
+    bool declared = std::any_of(columns_.begin(), columns_.end(),
+                                [&](const ColumnDecl& c) { return sameAscii(c.Key, column); });
+    if (!declared)
+        pelta::raise(pelta::errc::InvalidProcedureCall,
+                     "The grid " + gridName_ + " has no column " + column,
+                     "GridExtender.cellValue");
+    pelta::Variant value;
+    raise(events_.FetchData, bookmark, column, value);
+    return value;
+}
+
+std::vector<pelta::Variant> GridExtender::visibleBookmarks(int64_t first, int64_t count) {
+    std::vector<pelta::Variant> out;
+    if (!view_ || first < 0 || count <= 0 || first >= view_->recordCount()) return out;
+    // Walks the grid's own view and stands on the current row again.
+    const pelta::Variant current = CurrentBookmark();
+    view_->setAbsolutePosition(first + 1);
+    for (int64_t i = 0; i < count && !view_->eof(); ++i, view_->moveNext())
+        out.push_back(view_->bookmark());
+    if (!current.isEmpty())
+        standOn(current);
+    else
+        view_->moveFirst();
+    return out;
+}
+
+void GridExtender::scannerReceive(const std::string& code) {
+    raise(events_.ScannerReceive, code);
 }
 
 bool GridExtender::execute(int32_t commandID) {

@@ -94,6 +94,15 @@ public:
     void setRowFilter(const std::string& criteria);
     const std::string& rowFilter() const noexcept { return rowFilter_; }
 
+    // The value of a cell as the grid draws it: the bound field, or for a
+    // computed column what FetchData answers. Raises InvalidProcedureCall for
+    // an unknown column or a bookmark that is not a row.
+    pelta::Variant cellValue(const pelta::Variant& bookmark, const std::string& column);
+    // The bookmarks of the shown rows from `first` (0-based), at most `count`.
+    std::vector<pelta::Variant> visibleBookmarks(int64_t first, int64_t count);
+    // A barcode scanner delivers a code.
+    void scannerReceive(const std::string& code);
+
     // Whether a column is shown: declared visible and CanShowColumn agrees.
     bool columnVisible(const std::string& column);
     // The value a host paints in a column with no field in the rows (an
@@ -138,6 +147,7 @@ private:
     bool multiSelect_ = false;
     std::vector<pelta::Variant> selected_;
     std::set<double> baseline_;  // rows already pending when bound
+    RecordsetRef reader_;        // reads cells by bookmark without moving the grid
 };
 
 }  // namespace pelta::fw

@@ -115,6 +115,11 @@ public:
     // False when cancelled; `Value` carries the default in and the answer out.
     virtual bool InputBox(const std::string& Prompt, const std::string& Title,
                           pelta::Variant& Value) = 0;
+    // A dialog with one list field: `Choices` are offered (numbered from 1),
+    // `Choice` carries the preselected number in and the chosen one out.
+    // False when cancelled.
+    virtual bool InputList(const std::string& Title, const std::string& Prompt,
+                           const std::vector<std::string>& Choices, int32_t& Choice) = 0;
 
     // Settings under the screen's layout key.
     virtual pelta::Variant GetSetting(const std::string& Name, const pelta::Variant& Default) = 0;
@@ -168,6 +173,8 @@ struct GridEvents {
     std::function<void()> MenuNegotiateEx;
     std::function<void(int32_t CommandID, bool& Handled)> BeforeExecute;
     std::function<void()> DblClick;
+    // A code read by a barcode scanner while the grid had the focus.
+    std::function<void(const std::string& Code)> ScannerReceive;
 };
 
 class IGridExtender : public virtual pelta::Object {
@@ -284,6 +291,11 @@ public:
     virtual std::string Text(int32_t FilterID) = 0;
     // Applies every field's clause to the grid's rows.
     virtual void Apply() = 0;
+    // A field chosen from rows instead of typed: `FirstEntry` ("(Всички)")
+    // comes first and means no choice; the text of the field is then the
+    // chosen row's `KeyField` value.
+    virtual void SetFieldList(int32_t FilterID, RecordsetRef Rows, const std::string& KeyField,
+                              const std::string& ShownField, const std::string& FirstEntry) = 0;
 };
 
 struct FooterEvents {
@@ -322,6 +334,52 @@ public:
     virtual ReportEvents& Events() = 0;
     virtual void Init(pelta::Object* Owner, const std::string& Caption, const std::string& LibName,
                       const std::string& ObjectName) = 0;
+};
+
+// A band of filters above a list: drop-down lists that set what the list
+// shows (a price-list type, a store) without filtering its rows, and command
+// buttons. The framework raises Change when the user picks a value and Click
+// for a button.
+struct FilterBandEvents {
+    std::function<void(int32_t FilterID, const pelta::Variant& Value)> Change;
+    std::function<void(int32_t FilterID)> Click;
+};
+
+class IFilterBandExtender : public virtual pelta::Object {
+public:
+    virtual FilterBandEvents& Events() = 0;
+    virtual void Init(pelta::Object* Owner, const std::string& Caption) = 0;
+    // A drop-down list over rows (replaced when the filter exists): the key
+    // field is the value, the shown field its text; `FirstEntry` (may be
+    // empty) comes first and stands for the value Empty.
+    virtual void AddList(int32_t FilterID, const std::string& Caption, RecordsetRef Rows,
+                         const std::string& KeyField, const std::string& ShownField,
+                         const std::string& FirstEntry) = 0;
+    virtual void AddButton(int32_t FilterID, const std::string& Caption) = 0;
+    virtual pelta::Variant Value(int32_t FilterID) = 0;
+    // Sets the shown value without raising Change.
+    virtual void SetValue(int32_t FilterID, const pelta::Variant& Value) = 0;
+};
+
+// The cache of a list's result sets: the screen declares every named set
+// it uses (a result property of its read operation, or an index it derives
+// from them) with its key columns and a slot; the framework keeps what the
+// screen stores between fetches until the screen drops it by name.
+class ICacheDefExtender : public virtual pelta::Object {
+public:
+    virtual void Init(pelta::Object* Owner, const std::string& DataSource) = 0;
+    virtual std::string DataSource() = 0;
+    // Raises InvalidProcedureCall for a name or slot declared twice.
+    virtual void AddSet(const std::string& Name, int32_t Slot,
+                        const std::vector<std::string>& KeyColumns, bool Derived) = 0;
+    virtual bool IsCached(const std::string& Name) = 0;
+    // Empty when not cached.
+    virtual pelta::Variant Item(const std::string& Name) = 0;
+    virtual void SetItem(const std::string& Name, const pelta::Variant& Value) = 0;
+    virtual void Drop(const std::string& Name) = 0;
+    // The declared result sets (not derived) that are not cached, in the
+    // order of declaration.
+    virtual std::vector<std::string> Missing() = 0;
 };
 
 // Field extenders over combo boxes, selectors, check boxes and text fields.

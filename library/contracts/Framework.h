@@ -122,5 +122,7 @@ inline constexpr const char* kProgIdFooterExtender = "PeltaCm15.FooterExtender";
 inline constexpr const char* kProgIdPresetExtender = "PeltaCm15.PresetExtender";
 inline constexpr const char* kProgIdReportExtender = "PeltaCm15.ReportExtender";
 inline constexpr const char* kProgIdFieldExtender = "PeltaCm15.FieldExtender";
+inline constexpr const char* kProgIdFilterBandExtender = "PeltaCm15.FilterBandExtender";
+inline constexpr const char* kProgIdCacheDefExtender = "PeltaCm15.CacheDefExtender";
 
 }  // namespace PeltaNom15

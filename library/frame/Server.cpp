@@ -2,6 +2,7 @@
 // class identifiers, and the four exported entry points.
 #include "library/frame/LibObject.h"
 #include "library/frame/cFormDispatcher.h"
+#include "library/items/ctxItems.h"
 #include "library/other/ctxRatios.h"
 #include "library/partners/ctxContragents.h"
 #include "platform/automation/registry.h"
@@ -22,7 +23,7 @@ const pelta::InprocServer& server() {
         "PeltaNom15",
         {
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0001}", "cFormDispatcher", &create<cFormDispatcher>},
-            {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0002}", "ctxItems", nullptr},
+            {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0002}", "ctxItems", &create<ctxItems>},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0003}", "ctxFlat", nullptr},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0004}", "ctxDocTypes", nullptr},
             {"{5B0E1C60-8E5D-4C63-9F0B-2C6F1A7D0005}", "ctxAccAccounts", nullptr},

@@ -102,30 +102,32 @@ void cListFrame::m_oForm_Fetch(int32_t Step, bool& Cancel) {
         // An operation without parameters gets no bytes at all.
         auto response = CallBll(m_oForm.get(), m_oConnection.get(), m_oDef.ReadOperation,
                                 request->count() ? request.get() : nullptr);
-        if (!response || !pvTakeFetchResponse(*response)) {
-            Cancel = true;
-            return;
-        }
-        auto list = RecordsetProperty(response.get(), m_oDef.ListProperty);
-        if (!list) {
-            Cancel = true;
-            return;
-        }
-        m_rsList = list;
+        if (!response || !pvReadFetchResponse(*response)) Cancel = true;
     } catch (...) {
         Cancel = true;
         ShowError("m_oForm_Fetch", m_oDef.ObjectName, m_oDef.Caption);
     }
 }
 
+bool cListFrame::pvReadFetchResponse(pelta::PropertyBag& Response) {
+    auto list = RecordsetProperty(&Response, m_oDef.ListProperty);
+    if (!list) return false;
+    m_rsList = list;
+    return true;
+}
+
+void cListFrame::pvBindList() {
+    if (!m_rsList) return;
+    if (m_oDef.GroupColumn.empty())
+        m_oGridExt->Bind(m_rsList);
+    else
+        m_oGridExt->Bind(m_rsList, m_oDef.GroupColumn, pelta::Variant(m_oDef.GroupValue));
+    m_oGridExt->Refresh();
+}
+
 void cListFrame::m_oForm_FillControls() {
     try {
-        if (!m_rsList) return;
-        if (m_oDef.GroupColumn.empty())
-            m_oGridExt->Bind(m_rsList);
-        else
-            m_oGridExt->Bind(m_rsList, m_oDef.GroupColumn, pelta::Variant(m_oDef.GroupValue));
-        m_oGridExt->Refresh();
+        pvBindList();
     } catch (...) {
         PrintError("m_oForm_FillControls", m_oDef.ObjectName);
     }
@@ -133,6 +135,7 @@ void cListFrame::m_oForm_FillControls() {
 
 void cListFrame::m_oForm_BeforeExecute(int32_t CommandID, bool& Handled) {
     try {
+        // The list's own commands first: it may perform a frame command its way.
         if (pvExecute(CommandID)) {
             Handled = true;
             return;

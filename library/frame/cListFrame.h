@@ -67,11 +67,12 @@ protected:
     virtual void pvInitList() {}
     // Parameters of the read operation.
     virtual void pvWriteFetchRequest(pelta::PropertyBag& Request) {}
-    // The answer of the read operation, before its "List" is taken: further
-    // recordsets, or a refusal. False cancels the fetch.
-    virtual bool pvTakeFetchResponse(pelta::PropertyBag& Response) { return true; }
-    // Commands of the list, asked before the frame's own (so that a list may
-    // also perform 101, 102, 205 and 207 its own way); true when performed.
+    // Takes what the read operation answered; false cancels the fetch. The
+    // frame keeps the list property as the list recordset.
+    virtual bool pvReadFetchResponse(pelta::PropertyBag& Response);
+    // Binds the list recordset to the grid (Fill).
+    virtual void pvBindList();
+    // Commands of the list, asked before the frame's own; true when performed.
     virtual bool pvExecute(int32_t CommandID) { return false; }
     // The grid's own delete. Lists whose records may not be deleted that way
     // refuse it (the default); others delete through their operation.

@@ -184,6 +184,18 @@ pelta::Ref<IFieldExtender> CreateFieldExtender(IFormExtender* Form,
                                 [&](IFieldExtender& x) { x.Init(Form, ControlName); });
 }
 
+pelta::Ref<IFilterBandExtender> CreateFilterBandExtender(pelta::Object* Owner,
+                                                         const std::string& Caption) {
+    return make<IFilterBandExtender>(kProgIdFilterBandExtender, "CreateFilterBandExtender",
+                                     [&](IFilterBandExtender& x) { x.Init(Owner, Caption); });
+}
+
+pelta::Ref<ICacheDefExtender> CreateCacheDefExtender(pelta::Object* Owner,
+                                                     const std::string& DataSource) {
+    return make<ICacheDefExtender>(kProgIdCacheDefExtender, "CreateCacheDefExtender",
+                                   [&](ICacheDefExtender& x) { x.Init(Owner, DataSource); });
+}
+
 std::string SelectorProgID(const std::string& ProgID, int32_t Index) {
     std::string r = ProgID;
     const size_t n = Index <= 0 ? 0 : std::min<size_t>(static_cast<size_t>(Index), r.size());

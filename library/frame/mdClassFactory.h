@@ -53,6 +53,10 @@ pelta::Ref<IPresetExtender> CreatePresetExtender(pelta::Object* Owner,
 pelta::Ref<IReportExtender> CreateReportExtender(pelta::Object* Owner, const std::string& Caption,
                                                  const std::string& ObjectName);
 pelta::Ref<IFieldExtender> CreateFieldExtender(IFormExtender* Form, const std::string& ControlName);
+pelta::Ref<IFilterBandExtender> CreateFilterBandExtender(pelta::Object* Owner,
+                                                         const std::string& Caption);
+pelta::Ref<ICacheDefExtender> CreateCacheDefExtender(pelta::Object* Owner,
+                                                     const std::string& DataSource);
 
 // Property bags through the form extender's factory: an empty request bag,
 // or a response opened from its bytes and transport context.

@@ -220,7 +220,7 @@ void ctxContragents::pvWriteFetchRequest(pelta::PropertyBag& Request) {
     put("MediaValue", m_sMediaValue);
 }
 
-bool ctxContragents::pvTakeFetchResponse(pelta::PropertyBag& Response) {
+bool ctxContragents::pvReadFetchResponse(pelta::PropertyBag& Response) {
     const pelta::Variant refusal = Response.readProperty("BllError");
     if (!refusal.isEmpty()) {
         // Without the right to read the list the note stands in the grid's place.
@@ -242,7 +242,7 @@ bool ctxContragents::pvTakeFetchResponse(pelta::PropertyBag& Response) {
     m_lNextItem = 0;
     pvDeclareColumns();
     pvBuildTree();
-    return true;
+    return cListFrame::pvReadFetchResponse(Response);
 }
 
 void ctxContragents::pvDeclareColumns() {

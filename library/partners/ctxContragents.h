@@ -65,7 +65,7 @@ public:
 private:
     void pvInitList() override;
     void pvWriteFetchRequest(pelta::PropertyBag& Request) override;
-    bool pvTakeFetchResponse(pelta::PropertyBag& Response) override;
+    bool pvReadFetchResponse(pelta::PropertyBag& Response) override;
     bool pvExecute(int32_t CommandID) override;
 
     void pvBuildTree();

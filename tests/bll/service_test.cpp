@@ -76,7 +76,8 @@ TEST_F(ServiceTest, ConnectionKnowsItsUserAndParameters) {
     ASSERT_TRUE(scale);
     EXPECT_EQ(scale->Value().type(), pelta::VarType::Long);
     EXPECT_EQ(scale->Value().toLong(), 2);
-    EXPECT_TRUE(params->Item("DefPriceList_ID")->Value().isNull());
+    // The demo's retail price-list type is the default one.
+    EXPECT_TRUE(pelta::Guid::parse(params->Item("DefPriceList_ID")->Value().toString()));
     EXPECT_FALSE(params->Item("NoSuchParameter"));
     // Late bound, as a script would read it.
     Variant name("DefItmDimensionName");
