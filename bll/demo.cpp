@@ -5,8 +5,8 @@
 #include <random>
 
 #include "bll/database.h"
-#include "bll/demo_partners.h"
 #include "bll/demo_items.h"
+#include "bll/demo_partners.h"
 #include "bll/service.h"
 #include "platform/automation/guid.h"
 

@@ -14,7 +14,8 @@ constexpr char lowerAscii(char c) noexcept {
 
 inline std::string lowerAscii(std::string_view s) {
     std::string r(s);
-    for (char& c : r) c = lowerAscii(c);
+    for (char& c : r)
+        c = lowerAscii(c);
     return r;
 }
 
