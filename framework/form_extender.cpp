@@ -5,6 +5,7 @@
 #include "framework/extenders.h"
 #include "framework/services.h"
 #include "library/contracts/Constants.h"
+#include "platform/automation/ascii.h"
 #include "platform/automation/error.h"
 #include "platform/data/propertybag.h"
 #include "platform/data/recordset.h"
@@ -14,23 +15,6 @@ namespace pelta::fw {
 using namespace PeltaNom15;
 
 namespace {
-
-bool sameAscii(std::string_view a, std::string_view b) {
-    if (a.size() != b.size()) return false;
-    for (size_t i = 0; i < a.size(); ++i) {
-        char x = a[i], y = b[i];
-        if (x >= 'A' && x <= 'Z') x = static_cast<char>(x - 'A' + 'a');
-        if (y >= 'A' && y <= 'Z') y = static_cast<char>(y - 'A' + 'a');
-        if (x != y) return false;
-    }
-    return true;
-}
-
-std::string lowerAscii(std::string s) {
-    for (auto& c : s)
-        if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
-    return s;
-}
 
 pelta::Ref<UserAgent> requireAgent(const std::string& what) {
     auto agent = currentUserAgent();
@@ -162,7 +146,8 @@ void FormExtender::ShowCommand(int32_t CommandID, bool Visible) {
 
 bool FormExtender::executeShortcut(const std::string& shortcut) {
     for (const auto& c : menu_) {
-        if (!c.visible || !c.enabled || c.shortcut.empty() || !sameAscii(c.shortcut, shortcut))
+        if (!c.visible || !c.enabled || c.shortcut.empty() ||
+            !equalsNoCaseAscii(c.shortcut, shortcut))
             continue;
         Execute(c.id);
         return true;
@@ -402,14 +387,14 @@ void FormExtender::SaveSetting(const std::string& Name, const pelta::Variant& Va
 
 size_t FormExtender::controlIndex(const std::string& name) const {
     for (size_t i = 0; i < controls_.size(); ++i)
-        if (sameAscii(controls_[i].Name, name)) return i;
+        if (equalsNoCaseAscii(controls_[i].Name, name)) return i;
     pelta::raise(pelta::errc::InvalidProcedureCall,
                  "The form " + objectName_ + " declares no control " + name, "FormExtender");
 }
 
 bool FormExtender::hasControl(const std::string& name) const {
     for (const auto& c : controls_)
-        if (sameAscii(c.Name, name)) return true;
+        if (equalsNoCaseAscii(c.Name, name)) return true;
     return false;
 }
 
@@ -418,7 +403,7 @@ void FormExtender::DeclareControls(const std::vector<ControlDecl>& Controls) {
         const auto& c = Controls[i];
         bool duplicate = c.Name.empty() || hasControl(c.Name);
         for (size_t j = 0; j < i && !duplicate; ++j)
-            duplicate = sameAscii(Controls[j].Name, c.Name);
+            duplicate = equalsNoCaseAscii(Controls[j].Name, c.Name);
         if (duplicate)
             pelta::raise(pelta::errc::InvalidProcedureCall,
                          "The form " + objectName_ + " declares the control \"" + c.Name +
@@ -483,14 +468,14 @@ void FormExtender::userSetValue(const std::string& name, const pelta::Variant& v
     // Held while raising: a handler may create or drop field extenders.
     std::vector<pelta::Ref<FieldExtender>> fields(fields_.begin(), fields_.end());
     for (auto& f : fields)
-        if (sameAscii(f->controlName(), name)) f->raiseChange();
+        if (equalsNoCaseAscii(f->controlName(), name)) f->raiseChange();
 }
 
 void FormExtender::userClick(const std::string& name) {
     controlIndex(name);
     std::vector<pelta::Ref<FieldExtender>> fields(fields_.begin(), fields_.end());
     for (auto& f : fields)
-        if (sameAscii(f->controlName(), name)) f->raiseClick();
+        if (equalsNoCaseAscii(f->controlName(), name)) f->raiseClick();
 }
 
 void FormExtender::attachField(FieldExtender* field) {

@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "framework/services.h"
+#include "platform/automation/ascii.h"
 #include "platform/automation/error.h"
 #include "platform/data/recordset.h"
 
@@ -11,17 +12,6 @@ namespace pelta::fw {
 using namespace PeltaNom15;
 
 namespace {
-
-bool sameAscii(std::string_view a, std::string_view b) {
-    if (a.size() != b.size()) return false;
-    for (size_t i = 0; i < a.size(); ++i) {
-        char x = a[i], y = b[i];
-        if (x >= 'A' && x <= 'Z') x = static_cast<char>(x - 'A' + 'a');
-        if (y >= 'A' && y <= 'Z') y = static_cast<char>(y - 'A' + 'a');
-        if (x != y) return false;
-    }
-    return true;
-}
 
 // A value written as a literal of the filter grammar.
 std::string literal(const pelta::Variant& v) {
@@ -75,7 +65,7 @@ void GridExtender::Init(pelta::Object* Owner, const std::string& GridName, int32
 void GridExtender::DeclareColumns(const std::vector<ColumnDecl>& Columns) {
     for (size_t i = 0; i < Columns.size(); ++i)
         for (size_t j = 0; j < i; ++j)
-            if (Columns[i].Key.empty() || sameAscii(Columns[i].Key, Columns[j].Key))
+            if (Columns[i].Key.empty() || equalsNoCaseAscii(Columns[i].Key, Columns[j].Key))
                 pelta::raise(pelta::errc::InvalidProcedureCall,
                              "The grid " + gridName_ + " declares the column \"" + Columns[i].Key +
                                  "\" twice or without a key",
@@ -87,7 +77,7 @@ void GridExtender::SetColumnList(const std::string& Column, RecordsetRef Rows,
                                  const std::string& KeyField,
                                  const std::vector<std::string>& ShownFields) {
     auto it = std::find_if(columns_.begin(), columns_.end(),
-                           [&](const ColumnDecl& c) { return sameAscii(c.Key, Column); });
+                           [&](const ColumnDecl& c) { return equalsNoCaseAscii(c.Key, Column); });
     if (it == columns_.end())
         pelta::raise(pelta::errc::InvalidProcedureCall,
                      "The grid " + gridName_ + " has no column " + Column,
@@ -110,7 +100,7 @@ void GridExtender::SetColumnList(const std::string& Column, RecordsetRef Rows,
 
 const GridExtender::ColumnList* GridExtender::columnList(const std::string& column) const {
     for (const auto& [key, list] : lists_)
-        if (sameAscii(key, column)) return &list;
+        if (equalsNoCaseAscii(key, column)) return &list;
     return nullptr;
 }
 
@@ -204,7 +194,7 @@ bool GridExtender::HasCurrentRow() {
 
 std::string GridExtender::fieldOf(const std::string& column) const {
     for (const auto& c : columns_)
-        if (sameAscii(c.Key, column)) return c.Field;
+        if (equalsNoCaseAscii(c.Key, column)) return c.Field;
     return column;
 }
 
@@ -212,8 +202,9 @@ pelta::Variant GridExtender::CurrentValue(const std::string& Column) {
     if (!HasCurrentRow()) return {};
     auto field = fieldOf(Column);
     if (!field.empty() && view_->fieldIndex(field) >= 0) return view_->value(field);
-    bool declared = std::any_of(columns_.begin(), columns_.end(),
-                                [&](const ColumnDecl& c) { return sameAscii(c.Key, Column); });
+    bool declared = std::any_of(columns_.begin(), columns_.end(), [&](const ColumnDecl& c) {
+        return equalsNoCaseAscii(c.Key, Column);
+    });
     if (!declared)
         pelta::raise(pelta::errc::InvalidProcedureCall,
                      "The grid " + gridName_ + " has no column " + Column,
@@ -403,7 +394,7 @@ bool GridExtender::commitRow() {
 bool GridExtender::columnVisible(const std::string& column) {
     bool show = true;
     for (const auto& c : columns_)
-        if (sameAscii(c.Key, column)) show = c.Visible;
+        if (equalsNoCaseAscii(c.Key, column)) show = c.Visible;
     raise(events_.CanShowColumn, column, show);
     return show;
 }
@@ -436,8 +427,9 @@ pelta::Variant GridExtender::cellValue(const pelta::Variant& bookmark, const std
     }
     auto field = fieldOf(column);
     if (!field.empty() && reader_->fieldIndex(field) >= 0) return reader_->value(field);
-    bool declared = std::any_of(columns_.begin(), columns_.end(),
-                                [&](const ColumnDecl& c) { return sameAscii(c.Key, column); });
+    bool declared = std::any_of(columns_.begin(), columns_.end(), [&](const ColumnDecl& c) {
+        return equalsNoCaseAscii(c.Key, column);
+    });
     if (!declared)
         pelta::raise(pelta::errc::InvalidProcedureCall,
                      "The grid " + gridName_ + " has no column " + column,

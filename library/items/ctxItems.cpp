@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "library/contracts/Constants.h"
+#include "library/frame/Declarations.h"
 #include "library/frame/mdBllCall.h"
 #include "library/frame/mdBllErrors.h"
 #include "library/frame/mdClassFactory.h"
@@ -56,24 +57,6 @@ enum : int32_t {
     kFltFrame1 = 898,
     kFltFrame2 = 899,
 };
-
-ColumnDecl Bound(const char* Key, const char* Caption, bool Visible = true,
-                 const char* Format = "") {
-    ColumnDecl c;
-    c.Key = Key;
-    c.Field = Key;
-    c.Caption = Caption;
-    c.Visible = Visible;
-    c.Format = Format;
-    return c;
-}
-
-ColumnDecl Computed(const char* Key, const char* Caption, bool Visible = true,
-                    const char* Format = "") {
-    ColumnDecl c = Bound(Key, Caption, Visible, Format);
-    c.Field.clear();
-    return c;
-}
 
 std::vector<ColumnDecl> ItemColumns() {
     return {

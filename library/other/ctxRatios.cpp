@@ -1,21 +1,11 @@
 #include "library/other/ctxRatios.h"
 
 #include "library/contracts/Constants.h"
+#include "library/frame/Declarations.h"
 
 namespace PeltaNom15 {
 
 namespace {
-
-ColumnDecl Column(std::string Field, std::string Caption, bool Visible = true,
-                  std::string Format = {}) {
-    ColumnDecl c;
-    c.Key = Field;
-    c.Field = std::move(Field);
-    c.Caption = std::move(Caption);
-    c.Visible = Visible;
-    c.Format = std::move(Format);
-    return c;
-}
 
 ListDefinition RatiosList() {
     ListDefinition d;
@@ -36,16 +26,16 @@ ListDefinition RatiosList() {
         {kCmdDeleteInactive, {}, "Изтриване на неактивен валутен курс (Del)"},
     };
     d.Columns = {
-        Column("Date", "Дата", true, "dd.mm.yyyy"),
-        Column("PrName", "Банка"),
-        Column("IsActive", "Активен"),
-        Column("Note", "Забележка"),
-        Column("ID", "ID", false),
-        Column("Pr_ID", "Pr_ID", false),
-        Column("CU", "CU", false),
-        Column("CD", "CD", false),
-        Column("LU", "LU", false),
-        Column("LD", "LD", false),
+        Bound("Date", "Дата", true, "dd.mm.yyyy"),
+        Bound("PrName", "Банка"),
+        Bound("IsActive", "Активен"),
+        Bound("Note", "Забележка"),
+        Bound("ID", "ID", false),
+        Bound("Pr_ID", "Pr_ID", false),
+        Bound("CU", "CU", false),
+        Bound("CD", "CD", false),
+        Bound("LU", "LU", false),
+        Bound("LD", "LD", false),
     };
     return d;
 }

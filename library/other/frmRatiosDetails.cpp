@@ -3,6 +3,7 @@
 #include <cmath>
 
 #include "library/contracts/Constants.h"
+#include "library/frame/Declarations.h"
 #include "library/frame/mdBllCall.h"
 #include "library/frame/mdClassFactory.h"
 #include "library/frame/mdErrorHandling.h"
@@ -13,17 +14,6 @@
 namespace PeltaNom15 {
 
 namespace {
-
-ControlDecl Control(std::string Name, ControlKind Kind, std::string Caption, std::string Field,
-                    std::string Group = {}) {
-    ControlDecl c;
-    c.Name = std::move(Name);
-    c.Kind = Kind;
-    c.Caption = std::move(Caption);
-    c.Field = std::move(Field);
-    c.Group = std::move(Group);
-    return c;
-}
 
 DetailDefinition RatiosDetails() {
     DetailDefinition d;
@@ -50,18 +40,6 @@ DetailDefinition RatiosDetails() {
     };
     d.ModifiedFields = {"Date", "IsActive", "Pr_ID"};
     return d;
-}
-
-ColumnDecl Column(std::string Field, std::string Caption, EditorKind Editor, bool Visible = true,
-                  std::string Format = {}) {
-    ColumnDecl c;
-    c.Key = Field;
-    c.Field = std::move(Field);
-    c.Caption = std::move(Caption);
-    c.Editor = Editor;
-    c.Visible = Visible;
-    c.Format = std::move(Format);
-    return c;
 }
 
 bool IsBlank(const pelta::Variant& v) {

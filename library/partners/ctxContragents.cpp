@@ -1,6 +1,7 @@
 #include "library/partners/ctxContragents.h"
 
 #include "library/contracts/Constants.h"
+#include "library/frame/Declarations.h"
 #include "library/frame/Forms.h"
 #include "library/frame/mdBllCall.h"
 #include "library/frame/mdBllErrors.h"
@@ -127,14 +128,6 @@ ListDefinition ContragentsList() {
     };
     d.Columns = BaseColumns();
     return d;
-}
-
-ControlDecl Control(std::string Name, ControlKind Kind, std::string Caption = {}) {
-    ControlDecl c;
-    c.Name = std::move(Name);
-    c.Kind = Kind;
-    c.Caption = std::move(Caption);
-    return c;
 }
 
 std::string Text(const RecordsetRef& Rows, const char* Field) {

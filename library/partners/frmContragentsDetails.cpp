@@ -1,6 +1,7 @@
 #include "library/partners/frmContragentsDetails.h"
 
 #include "library/contracts/Constants.h"
+#include "library/frame/Declarations.h"
 #include "library/frame/mdBllCall.h"
 #include "library/frame/mdClassFactory.h"
 #include "library/frame/mdErrorHandling.h"
@@ -24,17 +25,6 @@ constexpr const char* kLists =
     "продажба|Документи за покупка|Документи за заявка|Складови документи|Протоколи за "
     "инвентаризация|Касови документи|Банкови документи|Гаранционни карти|Куриерски "
     "товарителници>Счетоводна система<Счетоводни документи>Организация<Работни карти|Договори>";
-
-ControlDecl Control(std::string Name, ControlKind Kind, std::string Caption, std::string Field,
-                    std::string Group = {}) {
-    ControlDecl c;
-    c.Name = std::move(Name);
-    c.Kind = Kind;
-    c.Caption = std::move(Caption);
-    c.Field = std::move(Field);
-    c.Group = std::move(Group);
-    return c;
-}
 
 DetailDefinition ContragentsDetails() {
     DetailDefinition d;
@@ -72,16 +62,6 @@ DetailDefinition ContragentsDetails() {
         d.Controls.push_back(std::move(c));
     }
     return d;
-}
-
-ColumnDecl Column(std::string Field, std::string Caption, EditorKind Editor, bool Visible = true) {
-    ColumnDecl c;
-    c.Key = Field;
-    c.Field = std::move(Field);
-    c.Caption = std::move(Caption);
-    c.Editor = Editor;
-    c.Visible = Visible;
-    return c;
 }
 
 // A fixed choice list "0|Име|1|Име..." as rows of ID and Name.
