@@ -321,7 +321,7 @@ void ctxItems::pvInitCache() {
 void ctxItems::pvInitFilters() {
     m_oQuickFilterExt = CreateQuickFilterExtender(this, m_oGridExt.get(), kQuickFindHint);
     if (m_oQuickFilterExt) {
-        m_oQuickFilterExt->AddField(kFltQuickFind, "",
+        m_oQuickFilterExt->AddField(kFltQuickFind, "Търсене",
                                     {"Name", "Code", "BarCodes", "SupplCodes", "Name2"});
         m_oQuickFilterExt->AddField(kFltType, "Тип", {"ItmType_ID"});
         m_oQuickFilterExt->AddField(kFltCategory, "Група", {"Categories"});

@@ -191,6 +191,14 @@ describe('pelta serve', () => {
     const items = page.locator('section.screen[data-kind=list]', { hasText: 'Записи: 40' });
     await items.waitFor();
     await items.locator('.ag-row').first().waitFor();
+    // Quick find by code ("/" prefix) leaves the one item.
+    const search = page.locator('section.screen[data-kind=list] .quick-filter input[name=filter-802]');
+    await search.fill('/0000007');
+    await search.press('Enter');
+    await page.locator('section.screen[data-kind=list]', { hasText: 'Записи: 1' }).waitFor();
+    await search.fill('');
+    await search.press('Enter');
+    await items.waitFor();
     await page.screenshot({ path: path.join(shotDir, 'pelta-items.png') });
   });
 
