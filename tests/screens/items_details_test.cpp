@@ -3,9 +3,39 @@
 // list, the duplicates the service refuses, the copy and the delete.
 #include "items_support.h"
 #include "library/items/frmItemsDetails.h"
+#include "platform/data/propertybag.h"
 
 namespace screentest {
 namespace {
+
+// Answers every save of an item with the refusal it was given, as a service
+// would that checks what this one does not.
+class RefusingConnection final : public IBllConnection {
+public:
+    explicit RefusingConnection(pelta::Ref<IBllConnection> inner) : inner_(std::move(inner)) {}
+    void Call(int32_t CallKind, const std::string& Operation, const pelta::Bytes& Request,
+              pelta::Bytes& Response, int32_t Reserved, pelta::ObjectRef& Context,
+              const std::string& Options, bool& Success) override {
+        if (Operation != "UpdNomItemsDetails" || code == 0) {
+            inner_->Call(CallKind, Operation, Request, Response, Reserved, Context, Options,
+                         Success);
+            return;
+        }
+        pelta::PropertyBag bag;
+        bag.writeProperty("BllError", pelta::Variant(code));
+        bag.writeProperty("BllItem", pelta::Variant("Цвят"));
+        Response = bag.contents();
+        Success = true;
+    }
+    pelta::Ref<IAppParameters> AppParameters() override { return inner_->AppParameters(); }
+    std::string CurrentUserID() override { return inner_->CurrentUserID(); }
+    std::string CurrentUserName() override { return inner_->CurrentUserName(); }
+
+    int32_t code = 0;
+
+private:
+    pelta::Ref<IBllConnection> inner_;
+};
 
 class ItemDetailsTest : public ItemsTest {
 protected:
@@ -267,6 +297,39 @@ TEST_F(ItemDetailsTest, ACopyTakesTheItemButNotItsCodeAndADeleteAsksFirst) {
     EXPECT_TRUE(f(d)->closed());
     EXPECT_FALSE(g()->MoveToRow("ID = '" + copy + "'"));
     EXPECT_EQ(agent->pending(), 0u);
+}
+
+TEST_F(ItemDetailsTest, FeatureRefusalsHaveTheirOwnMessagesAndOthersTheCommonOne) {
+    auto refusing = pelta::makeRef<RefusingConnection>(connection);
+    site = pelta::makeRef<pelta::fw::ClientSite>(refusing);
+    close();
+    open();
+    auto* d = newItem();
+    ASSERT_NE(d, nullptr);
+    f(d)->userSetValue("txtName", pelta::Variant("Признаци"));
+
+    refusing->code = 8103;
+    auto shown = refused(d);
+    EXPECT_EQ(shown.text, "Дублиране на код на признак от категория 'Цвят'");
+    EXPECT_EQ(shown.hint,
+              "Използвайте текстовото поле, за да модифицирате кода или го оставете празно за "
+              "автоматична генерация на пореден уникален номер.");
+    refusing->code = 8104;
+    shown = refused(d);
+    EXPECT_EQ(shown.text, "Дублиране на име на признак от категория 'Цвят'");
+    EXPECT_EQ(shown.hint, "Използвайте текстовото поле, за да модифицирате името.");
+
+    // Anything else is the common display of the service's errors.
+    refusing->code = 18;
+    shown = refused(d);
+    EXPECT_FALSE(shown.text.empty());
+    EXPECT_EQ(shown.text.find("Цвят"), std::string::npos);
+    EXPECT_TRUE(d->Key().empty());
+    EXPECT_EQ(C2Str(f(d)->ControlValue("txtName")), "Признаци") << "the edits stay";
+
+    refusing->code = 0;
+    agent->clear();
+    EXPECT_TRUE(d->FormExtender()->SaveDocument()) << agent->last().text;
 }
 
 TEST(ItemBomNames, NamesWithQuotesAreFoundNotParsed) {
