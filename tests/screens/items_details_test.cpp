@@ -94,6 +94,7 @@ TEST_F(ItemDetailsTest, ANewProductStartsWithItsDefaultsAndTheServiceNumbersIt) 
     EXPECT_EQ(C2Lng(f(d)->ControlValue("attPriceScale")), 2);
     EXPECT_EQ(C2Str(head->value("CU")), connection->CurrentUserID());
     EXPECT_EQ(C2Str(f(d)->ControlValue("txtCode")), "");
+    EXPECT_FALSE(f(d)->isModified()) << "an untouched new item closes without asking";
     EXPECT_NE(f(d)->controlList("cboItmType"), nullptr);
     EXPECT_EQ(f(d)->controlList("attTaxGroup")->rows->recordCount(), 4);
 
@@ -297,6 +298,45 @@ TEST_F(ItemDetailsTest, ACopyTakesTheItemButNotItsCodeAndADeleteAsksFirst) {
     EXPECT_TRUE(f(d)->closed());
     EXPECT_FALSE(g()->MoveToRow("ID = '" + copy + "'"));
     EXPECT_EQ(agent->pending(), 0u);
+}
+
+TEST_F(ItemDetailsTest, ARepeatedPriceOfATypeIsRefusedBeforeTheServiceIsCalled) {
+    auto* d = openItem(firstCode());
+    ASSERT_NE(d, nullptr);
+    auto prices = d->Rows("PriceList");
+    ASSERT_GT(prices->recordCount(), 0);
+    prices->moveFirst();
+    std::vector<std::pair<std::string, pelta::Variant>> row;
+    for (const char* field :
+         {"PlType_ID", "Cg_ID", "Currency_ID", "Measure_ID", "BasePrice", "BasePriceWithVat"})
+        row.emplace_back(field, prices->value(field));
+    prices->addNew();
+    prices->setValue("ID", pelta::Variant(pelta::newGuidString()));
+    for (const auto& [field, value] : row)
+        prices->setValue(field, value);
+    prices->update();
+    f(d)->userSetValue("txtNote", pelta::Variant("с цена"));
+    auto shown = refused(d);
+    EXPECT_EQ(shown.text, "Този тип ценова листа, доставчик и мярка вече са въведени в списъка.");
+    EXPECT_EQ(shown.title, "Дублиране на запис в ценови листи");
+    EXPECT_EQ(connection->calls["UpdNomItemsDetails"], 0);
+
+    // Another currency of the same type is a price of its own.
+    const std::string other =
+        text("SELECT ID FROM nom_currencies WHERE ID <> ?1 ORDER BY Code LIMIT 1", row[2].second);
+    prices->setValue("Currency_ID", pelta::Variant(other));
+    prices->update();
+    agent->clear();
+    EXPECT_TRUE(d->FormExtender()->SaveDocument()) << agent->last().text;
+}
+
+TEST_F(ItemDetailsTest, AnItemThatIsGoneIsToldAndNotShown) {
+    auto* d = openItem(firstCode());
+    ASSERT_NE(d, nullptr);
+    agent->clear();
+    EXPECT_FALSE(d->ShowDetails(pelta::newGuidString()));
+    EXPECT_EQ(agent->last().text,
+              "Номенклатурата не е намерена или недостатъчни права върху данни");
 }
 
 TEST_F(ItemDetailsTest, FeatureRefusalsHaveTheirOwnMessagesAndOthersTheCommonOne) {
