@@ -1,6 +1,8 @@
 // The item editor opened from the items list as the framework opens it: a
 // new product with its defaults, the checks in their order, saving into the
 // list, the duplicates the service refuses, the copy and the delete.
+#include <tuple>
+
 #include "items_support.h"
 #include "library/items/frmItemsDetails.h"
 #include "platform/data/propertybag.h"
@@ -328,6 +330,37 @@ TEST_F(ItemDetailsTest, ARepeatedPriceOfATypeIsRefusedBeforeTheServiceIsCalled) 
     prices->update();
     agent->clear();
     EXPECT_TRUE(d->FormExtender()->SaveDocument()) << agent->last().text;
+}
+
+TEST_F(ItemDetailsTest, OnlyALeafDirectionMayBeChosen) {
+    auto* d = openItem(firstCode());
+    ASSERT_NE(d, nullptr);
+    auto directions = d->Reference("FinStruct");
+    ASSERT_TRUE(directions);
+    const std::string parent = pelta::newGuidString(), leaf = pelta::newGuidString();
+    for (const auto& [id, up, name] :
+         {std::tuple{parent, std::string(), "Продажби"}, std::tuple{leaf, parent, "Търговия"}}) {
+        directions->addNew();
+        directions->setValue("ID", pelta::Variant(id));
+        if (!up.empty()) directions->setValue("P_ID", pelta::Variant(up));
+        directions->setValue("Name", pelta::Variant(name));
+        directions->update();
+    }
+    f(d)->userSetValue("attFinStruct_ID", pelta::Variant(parent));
+    auto shown = refused(d);
+    EXPECT_EQ(shown.control, "attFinStruct_ID");
+    EXPECT_EQ(shown.title, "Невалидно направление");
+    EXPECT_EQ(shown.text,
+              "Могат да се избират само крайни разклонения от списъка. Междинните възли в "
+              "структурата не са позволени за избор.");
+    EXPECT_EQ(shown.hint,
+              "Използвайте падащия списък, за да изберете елемент без наследници в йерархията с "
+              "направления.");
+    f(d)->userSetValue("attFinStruct_ID", pelta::Variant(leaf));
+    agent->clear();
+    ASSERT_TRUE(d->FormExtender()->SaveDocument()) << agent->last().text;
+    EXPECT_EQ(text("SELECT FinStruct_ID FROM nom_items WHERE ID = ?1", pelta::Variant(d->Key())),
+              leaf);
 }
 
 TEST_F(ItemDetailsTest, AnItemThatIsGoneIsToldAndNotShown) {
