@@ -150,6 +150,21 @@ void generateDemoItems(Database& db, const DemoItemsContext& c, int count, uint6
             st->step();
         }
     }
+    {
+        // The defaults a new item starts with.
+        auto def = [&](const char* sql, const std::string& id) {
+            auto st = db.prepare(sql);
+            st->bindText(1, id);
+            st->step();
+        };
+        def("UPDATE nom_itemtypes SET IsDef = 1 WHERE ID = ?1", types[0]);
+        def("UPDATE nom_itemtypes SET IsService = 1 WHERE ID = ?1", types[3]);
+        def("UPDATE nom_measures SET IsDef = 1 WHERE ID = ?1", measure[kPiece]);
+        def("UPDATE sys_settings SET Value = ?1 WHERE Name = 'DefCgStore_ID'", stores[0]);
+        def("UPDATE sys_settings SET Value = (SELECT Dimension_ID FROM nom_dimvalues WHERE ID = "
+            "?1) WHERE Name = 'DefItmDimension_ID'",
+            groups[0]);
+    }
     std::vector<std::string> plTypes;
     {
         auto st = db.prepare(

@@ -532,11 +532,36 @@ CREATE TABLE nom_cgdimlinks (
 CREATE INDEX ix_nom_cgdimlinks_value ON nom_cgdimlinks (DimValue_ID);
 )sql";
 
+// What the item's detail form keeps beyond the list: defaults of the
+// reference lists, the scales, the default store, the VAT group and the
+// settings a new item takes its values from.
+constexpr const char* kMigration5 = R"sql(
+ALTER TABLE nom_itemtypes ADD COLUMN IsDef BOOLEAN NOT NULL DEFAULT 0;
+ALTER TABLE nom_itemtypes ADD COLUMN IsService BOOLEAN NOT NULL DEFAULT 0;
+ALTER TABLE nom_measures ADD COLUMN IsDef BOOLEAN NOT NULL DEFAULT 0;
+ALTER TABLE nom_dimensions ADD COLUMN ValueType INTEGER NOT NULL DEFAULT 1;
+ALTER TABLE nom_dimensions ADD COLUMN IsRequired BOOLEAN NOT NULL DEFAULT 0;
+ALTER TABLE nom_items ADD COLUMN IsService BOOLEAN NOT NULL DEFAULT 0;
+ALTER TABLE nom_items ADD COLUMN CgStore_ID GUID REFERENCES nom_stores (ID);
+ALTER TABLE nom_items ADD COLUMN SecMeasure2_ID GUID REFERENCES nom_measures (ID);
+ALTER TABLE nom_items ADD COLUMN PriceScale INTEGER NOT NULL DEFAULT 2;
+ALTER TABLE nom_items ADD COLUMN BasicMeasureScale INTEGER NOT NULL DEFAULT 0;
+ALTER TABLE nom_items ADD COLUMN TaxGroup INTEGER NOT NULL DEFAULT 2;
+ALTER TABLE nom_items ADD COLUMN FinStruct_ID GUID;
+
+INSERT INTO sys_settings (Name, Kind, Value) VALUES
+    ('DefCgStore_ID', 'Guid', NULL),
+    ('DefItmDimension_ID', 'Guid', NULL),
+    ('Vat', 'Decimal', '20'),
+    ('DefPriceScale', 'Long', '2');
+)sql";
+
 constexpr Migration kMigrations[] = {
     {1, "users, groups, rights and settings", kMigration1},
     {2, "currencies, banks and currency rates", kMigration2},
     {3, "items, measures, stores, price lists, balances and discounts", kMigration3},
     {4, "business partners", kMigration4},
+    {5, "item details: defaults, scales and store", kMigration5},
 };
 
 int currentVersion(Database& db) {

@@ -92,6 +92,7 @@ void registerSecurityOperations(OperationRegistry& r);
 void registerCurrencyOperations(OperationRegistry& r);
 void registerPartnerOperations(OperationRegistry& r);
 void registerItemOperations(OperationRegistry& r);
+void registerItemDetailOperations(OperationRegistry& r);
 
 // --- Lists ---------------------------------------------------------------
 

@@ -448,6 +448,7 @@ void registerItemOperations(OperationRegistry& r) {
     r.add("UpdNomItemsBomPrices", &updNomItemsBomPrices, true);
     r.add("GenerNomItemsCostCenters", &generNomItemsCostCenters, true);
     registerList(kItemsScreen, kItemsList);
+    registerItemDetailOperations(r);
 }
 
 }  // namespace pelta::bll

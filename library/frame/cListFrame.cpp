@@ -186,11 +186,13 @@ pelta::Ref<IDetailForm> cListFrame::pvGetDetailForm() {
         }
     }
     form->SetOpener([this](RecordsetRef Row) { pvMergeListRow(Row); },
-                    [this] {
-                        if (m_oForm) m_oForm->Refresh();
-                    });
+                    [this] { pvDetailDeleted(); });
     m_oDetailForm = form;
     return form;
+}
+
+void cListFrame::pvDetailDeleted() {
+    if (m_oForm) m_oForm->Refresh();
 }
 
 void cListFrame::pvShowDetails(const std::string& Key) {

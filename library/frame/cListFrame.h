@@ -74,6 +74,8 @@ protected:
     virtual void pvBindList();
     // Commands of the list, asked before the frame's own; true when performed.
     virtual bool pvExecute(int32_t CommandID) { return false; }
+    // The detail form deleted its record: the list reads itself again.
+    virtual void pvDetailDeleted();
     // The grid's own delete. Lists whose records may not be deleted that way
     // refuse it (the default); others delete through their operation.
     virtual void m_oGridExt_BeforeDelete(bool& Cancel) { Cancel = true; }

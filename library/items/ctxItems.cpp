@@ -628,6 +628,11 @@ bool ctxItems::pvExecute(int32_t CommandID) {
     }
 }
 
+// The list is kept between refreshes: a deleted item is read away.
+void ctxItems::pvDetailDeleted() {
+    pvRefresh(true);
+}
+
 std::vector<std::string> ctxItems::pvSelectedIDs(bool OnlyInactive) {
     std::vector<std::string> ids;
     if (!m_rsList) return ids;

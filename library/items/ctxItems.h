@@ -74,6 +74,7 @@ protected:
     bool pvReadFetchResponse(pelta::PropertyBag& Response) override;
     void pvBindList() override;
     bool pvExecute(int32_t CommandID) override;
+    void pvDetailDeleted() override;
 
 private:
     friend class cItemsQuickFind;
