@@ -202,6 +202,39 @@ describe('pelta serve', () => {
     await page.screenshot({ path: path.join(shotDir, 'pelta-items.png') });
   });
 
+  test('an item is opened from the list, changed, saved and found by its new second name', async () => {
+    const items = page.locator('section.screen[data-kind=list]:not([hidden])');
+    const search = items.locator('.quick-filter input[name=filter-802]');
+    const find = async (text) => {
+      await search.fill(text);
+      await search.press('Enter');
+    };
+    const itemsFooter = (n) => items.locator('.footer', { hasText: new RegExp(`Записи: ${n}$`) });
+    const field = (name) => form().locator(`[data-control=${name}]`);
+    await find('/0000007');
+    await itemsFooter(1).waitFor();
+    const name = (await items.locator('.ag-row[row-index="0"] .ag-cell[col-id="Name"]').textContent()).trim();
+    await items.locator('.ag-row[row-index="0"]').dblclick();
+    await form().waitFor();
+    assert.equal(await field('txtName').inputValue(), name);
+    assert.equal(await field('txtCode').inputValue(), '0000007');
+    await field('txtName').fill(`${name} (нов)`);
+    await field('attName2').fill('Браузърно второ име');
+    await page.screenshot({ path: path.join(shotDir, 'pelta-item-form.png'), fullPage: true });
+    await page.keyboard.press('Control+s');
+    await page.locator('#status', { hasText: 'Записано' }).waitFor();
+
+    // The list shows the change and its quick find searches the second name.
+    await page.locator('.tab', { hasText: 'Продукти и материали' }).click();
+    await items.locator('.ag-row[row-index="0"]', { hasText: `${name} (нов)` }).waitFor();
+    await find('Браузърно второ');
+    await itemsFooter(1).waitFor();
+    await items.locator('.ag-row', { hasText: `${name} (нов)` }).waitFor();
+
+    await find('');
+    await itemsFooter(40).waitFor();
+  });
+
   test('a closed tab releases its session and terminates its screens', async () => {
     await page.close({ runBeforeUnload: true });
     await assert.doesNotReject(async () => {
@@ -210,7 +243,7 @@ describe('pelta serve', () => {
     });
     const m = server.errors().match(/released: (\d+) screens terminated/);
     assert.ok(m, server.errors());
-    assert.equal(Number(m[1]), 2); // the two lists; the rate's detail form had closed
+    assert.equal(Number(m[1]), 3); // the two lists and the item form; the rate's form had closed
     const output = await stopServer(server);
     server = null;
     assert.match(output, /library objects released: yes/);

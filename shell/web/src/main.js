@@ -95,10 +95,13 @@ async function execute(screen, command) {
 async function save(screen) {
   // A field being edited sends its change first.
   await settled();
+  // The status tells of this save only, not of an earlier one.
+  status('Записване...');
   try {
     const reply = await connection.post(`/api/screens/${screen.description.id}/save`);
     status(reply.saved ? 'Записано' : 'Не е записано');
   } catch (e) {
+    status('Не е записано');
     reportError(e);
   }
 }
