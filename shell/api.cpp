@@ -529,7 +529,11 @@ ApiResponse Api::route(const ApiRequest& r) {
         }));
     }
     if (action == "save") {
-        return ok(s.ui().call([&] { return json{{"saved", needScreen()->save()}}; }));
+        return ok(s.ui().call([&] {
+            auto screen = needScreen();
+            bool saved = screen->save();
+            return json{{"saved", saved}, {"unchanged", screen->savedNothing()}};
+        }));
     }
     throw ApiError(404, "No such resource");
 }

@@ -436,6 +436,7 @@ public:
     }
 
     bool save() override;
+    bool savedNothing() const override { return savedNothing_; }
 
     std::string addRow(const std::string& grid) override {
         fw::GridExtender& g = gridNamed(grid);
@@ -472,6 +473,9 @@ public:
 
 protected:
     bool editableGrids() const override { return true; }
+
+private:
+    bool savedNothing_ = false;
 };
 
 // The framework's user agent of a session's thread: the session's dialogs.
@@ -651,7 +655,12 @@ bool DetailScreen::save() {
     if (!form_) return false;
     pelta::Ref<fw::FormExtender> keep = form_;
     FrameworkSession& session = *session_;
-    bool saved = commitRows() && keep->SaveDocument();
+    savedNothing_ = false;
+    bool saved = commitRows();
+    if (saved && !keep->isModified())
+        savedNothing_ = true;  // the framework has nothing to write: say so, not "saved"
+    else if (saved)
+        saved = keep->SaveDocument();
     session.afterAction();
     return saved;
 }

@@ -123,6 +123,8 @@ public:
     virtual void setValue(const std::string& control, const Variant& value) = 0;
     // Validates, uploads and saves; false when refused (a message said why).
     virtual bool save() = 0;
+    // True when the last save found nothing changed and so wrote nothing.
+    virtual bool savedNothing() const { return false; }
 
     // Editable grids. The defaults raise: a screen without such grids.
     // A new row in `grid`; answers its key.

@@ -280,7 +280,13 @@ TEST_F(LibraryScreensTest, ANewRateIsEnteredSavedAndShownInTheList) {
     EXPECT_EQ(rowsGrid["editable"], true);
     EXPECT_FALSE(rowsGrid["columns"][0]["options"].empty()) << "the currencies are offered";
 
-    EXPECT_EQ(ok("POST", path(detail, "save"), "{}")["saved"], true);
+    json saved = ok("POST", path(detail, "save"), "{}");
+    EXPECT_EQ(saved["saved"], true);
+    EXPECT_EQ(saved["unchanged"], false);
+    EXPECT_EQ(count("SELECT COUNT(*) FROM nom_currratios"), before + 1);
+    // Saving again with nothing changed writes nothing and says so.
+    json again = ok("POST", path(detail, "save"), "{}");
+    EXPECT_EQ(again["unchanged"], true);
     EXPECT_EQ(count("SELECT COUNT(*) FROM nom_currratios"), before + 1);
     EXPECT_EQ(count("SELECT Rate FROM nom_currratiosdetails d JOIN nom_currratios r ON "
                     "r.ID = d.CurrRatio_ID WHERE r.Date = 47972"),

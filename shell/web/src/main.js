@@ -99,7 +99,7 @@ async function save(screen) {
   status('Записване...');
   try {
     const reply = await connection.post(`/api/screens/${screen.description.id}/save`);
-    status(reply.saved ? 'Записано' : 'Не е записано');
+    status(reply.unchanged ? 'Няма промени за запис' : reply.saved ? 'Записано' : 'Не е записано');
   } catch (e) {
     status('Не е записано');
     reportError(e);
