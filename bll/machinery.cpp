@@ -187,6 +187,39 @@ const ListDef* findList(std::string_view screen) {
     return it == lists.end() ? nullptr : &it->second;
 }
 
+FieldDef field(const char* name, FieldType type) {
+    FieldDef f;
+    f.name = name;
+    f.type = type;
+    return f;
+}
+
+Ref<Recordset> emptyList(std::initializer_list<FieldDef> fields) {
+    auto rs = makeRef<Recordset>();
+    for (const FieldDef& f : fields)
+        rs->appendField(f);
+    rs->open();
+    return rs;
+}
+
+bool isBlank(const Variant& v) {
+    if (v.isEmpty() || v.isNull()) return true;
+    if (!v.isString()) return false;
+    return v.str().find_first_not_of(" \t") == std::string::npos;
+}
+
+std::string trimmed(const Variant& v) {
+    if (isBlank(v)) return {};
+    std::string s = v.toString();
+    const size_t b = s.find_first_not_of(" \t");
+    return s.substr(b, s.find_last_not_of(" \t") - b + 1);
+}
+
+Ref<Recordset> emptyKeyed() {
+    return emptyList({field("ID", FieldType::Guid), field("Code", FieldType::Text),
+                      field("Name", FieldType::Text)});
+}
+
 Ref<Recordset> readRecordset(Database& db, std::string_view sql, std::span<const Variant> params,
                              std::span<const FieldDef> fields) {
     auto st = db.prepare(sql);

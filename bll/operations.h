@@ -5,6 +5,7 @@
 
 #include <cstdint>
 #include <functional>
+#include <initializer_list>
 #include <span>
 #include <string>
 #include <string_view>
@@ -111,6 +112,17 @@ const ListDef* findList(std::string_view screen);
 // recordset. Fields follow the declared types of the result columns;
 // `fields` gives the shape of columns that are expressions (matched by name).
 // Rows come back unmodified.
+// An empty, open recordset of the given shape: what a list whose table belongs
+// to another part of the system answers.
+FieldDef field(const char* name, FieldType type);
+Ref<Recordset> emptyList(std::initializer_list<FieldDef> fields);
+// An empty reference list of ID, Code and Name.
+Ref<Recordset> emptyKeyed();
+// Text as typed: Empty, Null and text of spaces and tabs are blank; trimmed
+// drops the spaces and tabs around it.
+bool isBlank(const Variant& v);
+std::string trimmed(const Variant& v);
+
 Ref<Recordset> readRecordset(Database& db, std::string_view sql,
                              std::span<const Variant> params = {},
                              std::span<const FieldDef> fields = {});

@@ -15,43 +15,10 @@ namespace {
 constexpr char kScreen[] = "ctxItems";
 constexpr char kTable[] = "nom_items";
 
-FieldDef field(const char* name, FieldType type) {
-    FieldDef f;
-    f.name = name;
-    f.type = type;
-    return f;
-}
-
-Ref<Recordset> emptyList(std::initializer_list<FieldDef> fields) {
-    auto rs = makeRef<Recordset>();
-    for (const FieldDef& f : fields)
-        rs->appendField(f);
-    rs->open();
-    return rs;
-}
-
 // A sub-list whose table belongs to another part of the system: answered
 // empty, taken back without being written.
 Ref<Recordset> emptySubList() {
     return emptyList({field("ID", FieldType::Guid), field("Itm_ID", FieldType::Guid)});
-}
-
-Ref<Recordset> emptyKeyed() {
-    return emptyList({field("ID", FieldType::Guid), field("Code", FieldType::Text),
-                      field("Name", FieldType::Text)});
-}
-
-bool isBlank(const Variant& v) {
-    if (v.isEmpty() || v.isNull()) return true;
-    if (!v.isString()) return false;
-    return v.str().find_first_not_of(" \t") == std::string::npos;
-}
-
-std::string trimmed(const Variant& v) {
-    if (isBlank(v)) return {};
-    std::string s = v.toString();
-    const size_t b = s.find_first_not_of(" \t");
-    return s.substr(b, s.find_last_not_of(" \t") - b + 1);
 }
 
 // The lists of an item, in the order the form sends them. `table` null: kept

@@ -23,28 +23,6 @@ constexpr int32_t kDuplicateTaxNo = 8109;
 // At most this many partner types restrict a list.
 constexpr size_t kMaxTypes = 200;
 
-FieldDef field(const char* name, FieldType type) {
-    FieldDef f;
-    f.name = name;
-    f.type = type;
-    return f;
-}
-
-// An empty recordset of the given shape: a list whose table belongs to
-// another part of the system.
-Ref<Recordset> emptyList(std::initializer_list<FieldDef> fields) {
-    auto rs = makeRef<Recordset>();
-    for (const FieldDef& f : fields)
-        rs->appendField(f);
-    rs->open();
-    return rs;
-}
-
-Ref<Recordset> emptyKeyed() {
-    return emptyList({field("ID", FieldType::Guid), field("Code", FieldType::Text),
-                      field("Name", FieldType::Text)});
-}
-
 Ref<Recordset> emptySubList() {
     return emptyList({field("ID", FieldType::Guid), field("Cg_ID", FieldType::Guid)});
 }
@@ -54,18 +32,6 @@ Variant setting(Database& db, const char* name) {
     st->bindText(1, name);
     if (!st->step() || st->isNull(0)) return Variant::null();
     return Variant(std::string(st->text(0)));
-}
-
-std::string trimmed(const Variant& v) {
-    if (v.isEmpty() || v.isNull()) return {};
-    std::string s = v.toString();
-    const auto b = s.find_first_not_of(" \t");
-    if (b == std::string::npos) return {};
-    return s.substr(b, s.find_last_not_of(" \t") - b + 1);
-}
-
-bool isBlank(const Variant& v) {
-    return trimmed(v).empty();
 }
 
 // --- The list -----------------------------------------------------------------

@@ -33,6 +33,31 @@ RecordsetRef cDetailFrame::Head() const {
     return m_rsHead;
 }
 
+IGridExtender* cDetailFrame::Grid(const std::string& ControlName) const {
+    auto it = m_oGrids.find(ControlName);
+    return it == m_oGrids.end() ? nullptr : it->second.get();
+}
+
+RecordsetRef cDetailFrame::Rows(const std::string& SubList) const {
+    auto it = m_oRows.find(SubList);
+    return it == m_oRows.end() ? RecordsetRef() : it->second;
+}
+
+RecordsetRef cDetailFrame::Reference(const std::string& Name) const {
+    auto it = m_oRefs.find(Name);
+    return it == m_oRefs.end() ? RecordsetRef() : it->second;
+}
+
+bool cDetailFrame::pvCreateGrids(std::span<const GridDecl> Grids) {
+    for (const GridDecl& g : Grids) {
+        auto grid = CreateGridExtender(this, g.Control, {}, g.HelpID);
+        if (!grid) return false;
+        grid->DeclareColumns(g.Columns);
+        m_oGrids[g.Control] = grid;
+    }
+    return true;
+}
+
 bool cDetailFrame::frInit(IClientSite* Site) {
     try {
         if (!Site) return false;
@@ -327,6 +352,11 @@ void cDetailFrame::Terminate() {
     try {
         m_fnRowSaved = nullptr;
         m_fnRecordDeleted = nullptr;
+        for (auto& [name, grid] : m_oGrids)
+            grid->Events() = {};
+        m_oGrids.clear();
+        m_oRows.clear();
+        m_oRefs.clear();
         if (m_oForm) m_oForm->Events() = {};
         m_oForm.reset();
         m_oDetailOpener.reset();

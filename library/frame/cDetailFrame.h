@@ -9,6 +9,8 @@
 
 #include <cstdint>
 #include <functional>
+#include <map>
+#include <span>
 #include <string>
 #include <vector>
 
@@ -53,6 +55,11 @@ public:
 
     const std::string& Key() const noexcept { return m_sKey; }
     RecordsetRef Head() const;
+    // The form's row grids by control name, its sub-lists and reference
+    // lists by name; null when the form has none of that name.
+    IGridExtender* Grid(const std::string& ControlName) const;
+    RecordsetRef Rows(const std::string& SubList) const;
+    RecordsetRef Reference(const std::string& Name) const;
 
 protected:
     explicit cDetailFrame(DetailDefinition Def);
@@ -97,6 +104,14 @@ protected:
     }
 
     // ---- shared ----
+    // A row grid of the form: its control, help number and columns.
+    struct GridDecl {
+        const char* Control;
+        int32_t HelpID;
+        std::vector<ColumnDecl> Columns;
+    };
+    // Creates the grids and keeps them by control name; False when one fails.
+    bool pvCreateGrids(std::span<const GridDecl> Grids);
     bool pvHasRight(int32_t RightFlag);
     // The value of a control as a head field takes it: Null for an empty one.
     pelta::Variant pvControlField(const std::string& ControlName);
@@ -110,6 +125,9 @@ protected:
     pelta::Ref<IDetailOpener> m_oDetailOpener;
     std::string m_sKey;
     RecordsetRef m_rsHead;
+    std::map<std::string, pelta::Ref<IGridExtender>> m_oGrids;  // by control name
+    std::map<std::string, RecordsetRef> m_oRows;                // sub-lists by name
+    std::map<std::string, RecordsetRef> m_oRefs;                // reference lists by name
     int32_t m_lInstanceID = 0;
 
 private:

@@ -147,27 +147,7 @@ bool frmItemsDetails::BomNameTaken(const RecordsetRef& Boms, const std::string& 
     return b->find("Name='" + SqlQuote(Name) + "'");
 }
 
-IGridExtender* frmItemsDetails::Grid(const std::string& ControlName) const {
-    auto it = m_oGrids.find(ControlName);
-    return it == m_oGrids.end() ? nullptr : it->second.get();
-}
-
-RecordsetRef frmItemsDetails::Rows(const std::string& SubList) const {
-    auto it = m_oRows.find(SubList);
-    return it == m_oRows.end() ? RecordsetRef() : it->second;
-}
-
-RecordsetRef frmItemsDetails::Reference(const std::string& Name) const {
-    auto it = m_oRefs.find(Name);
-    return it == m_oRefs.end() ? RecordsetRef() : it->second;
-}
-
 bool frmItemsDetails::pvInitForm() {
-    struct GridDecl {
-        const char* Control;
-        int32_t HelpID;
-        std::vector<ColumnDecl> Columns;
-    };
     const GridDecl grids[] = {
         {"geMeasures",
          2111,
@@ -184,12 +164,7 @@ bool frmItemsDetails::pvInitForm() {
          {Column("Code", "Код", EditorKind::Text), Column("Measure_ID", "Мярка", EditorKind::Combo),
           Column("ID", "ID", EditorKind::None, false)}},
     };
-    for (const GridDecl& g : grids) {
-        auto grid = CreateGridExtender(this, g.Control, {}, g.HelpID);
-        if (!grid) return false;
-        grid->DeclareColumns(g.Columns);
-        m_oGrids[g.Control] = grid;
-    }
+    if (!pvCreateGrids(grids)) return false;
     auto groups = pelta::makeRef<pelta::Recordset>();
     groups->appendField("ID", pelta::FieldType::Long);
     groups->appendField("Name", pelta::FieldType::Text);
@@ -553,11 +528,6 @@ bool frmItemsDetails::pvExecute(int32_t CommandID) {
 }
 
 void frmItemsDetails::Terminate() {
-    for (auto& [name, grid] : m_oGrids)
-        grid->Events() = {};
-    m_oGrids.clear();
-    m_oRows.clear();
-    m_oRefs.clear();
     m_oCopy.reset();
     cDetailFrame::Terminate();
 }

@@ -22,9 +22,6 @@ public:
     static bool BomNameTaken(const RecordsetRef& Boms, const std::string& Name);
 
     // What hosts drive and show.
-    IGridExtender* Grid(const std::string& ControlName) const;
-    RecordsetRef Rows(const std::string& SubList) const;
-    RecordsetRef Reference(const std::string& Name) const;
     void Terminate() override;
 
 private:
@@ -45,10 +42,6 @@ private:
     pelta::Variant pvParameter(const char* Name);
     std::string pvText(const std::string& ControlName);
     pelta::Variant pvDefault(const char* Reference, const char* Flag = "IsDef");
-
-    std::map<std::string, pelta::Ref<IGridExtender>> m_oGrids;  // by control name
-    std::map<std::string, RecordsetRef> m_oRows;                // sub-lists by name
-    std::map<std::string, RecordsetRef> m_oRefs;                // reference lists by name
 
     // The item a copy (318) is made of: its head values and measure facets.
     struct CopySource {

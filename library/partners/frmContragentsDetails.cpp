@@ -103,27 +103,7 @@ const std::vector<std::string>& frmContragentsDetails::SubLists() {
     return names;
 }
 
-IGridExtender* frmContragentsDetails::Grid(const std::string& ControlName) const {
-    auto it = m_oGrids.find(ControlName);
-    return it == m_oGrids.end() ? nullptr : it->second.get();
-}
-
-RecordsetRef frmContragentsDetails::Rows(const std::string& SubList) const {
-    auto it = m_oRows.find(SubList);
-    return it == m_oRows.end() ? RecordsetRef() : it->second;
-}
-
-RecordsetRef frmContragentsDetails::Reference(const std::string& Name) const {
-    auto it = m_oRefs.find(Name);
-    return it == m_oRefs.end() ? RecordsetRef() : it->second;
-}
-
 bool frmContragentsDetails::pvInitForm() {
-    struct GridDecl {
-        const char* Control;
-        int32_t HelpID;
-        std::vector<ColumnDecl> Columns;
-    };
     const GridDecl grids[] = {
         {"gePersons",
          2211,
@@ -165,12 +145,7 @@ bool frmContragentsDetails::pvInitForm() {
          {Column("Checked", "", EditorKind::CheckBox), Column("Name", "Име", EditorKind::None),
           Column("ID", "ID", EditorKind::None, false)}},
     };
-    for (const GridDecl& g : grids) {
-        auto grid = CreateGridExtender(this, g.Control, {}, g.HelpID);
-        if (!grid) return false;
-        grid->DeclareColumns(g.Columns);
-        m_oGrids[g.Control] = grid;
-    }
+    if (!pvCreateGrids(grids)) return false;
 
     m_oTreeListsExt = CreateTreeExtender(this, "tvLists");
     if (!m_oTreeListsExt) return false;
@@ -393,9 +368,6 @@ void frmContragentsDetails::Terminate() {
     if (m_oForm && m_oTreeListsExt)
         m_oForm->SaveSetting("TreeLists", pelta::Variant(m_oTreeListsExt->SelectedKey()));
     if (m_oSplitterTreeExt) m_oSplitterTreeExt->SetPosition(m_oSplitterTreeExt->Position());
-    for (auto& [name, grid] : m_oGrids)
-        grid->Events() = {};
-    m_oGrids.clear();
     if (m_oTreeListsExt) m_oTreeListsExt->Events() = {};
     if (m_oTypeFieldExt) m_oTypeFieldExt->Events() = {};
     if (m_oNameFieldExt) m_oNameFieldExt->Events() = {};
@@ -403,8 +375,6 @@ void frmContragentsDetails::Terminate() {
     m_oSplitterTreeExt.reset();
     m_oTypeFieldExt.reset();
     m_oNameFieldExt.reset();
-    m_oRows.clear();
-    m_oRefs.clear();
     m_rsDimChoice.reset();
     m_oCopy.reset();
     cDetailFrame::Terminate();

@@ -21,9 +21,6 @@ public:
     static const std::vector<std::string>& SubLists();
 
     // What hosts drive and show.
-    IGridExtender* Grid(const std::string& ControlName) const;
-    RecordsetRef Rows(const std::string& SubList) const;
-    RecordsetRef Reference(const std::string& Name) const;
     void Terminate() override;
 
 private:
@@ -57,14 +54,11 @@ private:
     std::string pvText(const std::string& ControlName);
     bool pvIsNaturalPersonType(const std::string& TypeID);
 
-    std::map<std::string, pelta::Ref<IGridExtender>> m_oGrids;  // by control name
     pelta::Ref<ITreeExtender> m_oTreeListsExt;
     pelta::Ref<ISplitterExtender> m_oSplitterTreeExt;
     pelta::Ref<IFieldExtender> m_oTypeFieldExt;
     pelta::Ref<IFieldExtender> m_oNameFieldExt;
-    std::map<std::string, RecordsetRef> m_oRows;  // sub-lists by name
-    std::map<std::string, RecordsetRef> m_oRefs;  // reference lists by name
-    RecordsetRef m_rsDimChoice;                   // values of a several-values dimension
+    RecordsetRef m_rsDimChoice;  // values of a several-values dimension
 
     // The partner a copy (318) is made of: its head values and sub-lists.
     struct CopySource {
