@@ -398,4 +398,83 @@ public:
     virtual void SetValue(const pelta::Variant& Value) = 0;
 };
 
+// ---- attribute grid ------------------------------------------------------------
+
+// The attribute grid of a detail form: further fields of the head, one row
+// each ("Име", "Стойност"), in numbered groups, with the chosen row's help
+// text shown under the grid. Values live in the bound head row: the grid
+// reads them from it and writes what the person enters straight into it.
+enum class AttribEditor {
+    Entry,  // text, or a number when Format is given
+    CheckBox,
+    List,       // rows of a reference set (SetList)
+    FixedList,  // the fixed choices of Values
+    Selector,   // a record of another nomenclature, picked by the screen
+    TreeList,   // rows of a reference set with a parent field (SetList)
+};
+
+struct AttribDecl {
+    int32_t Group = 0;    // one of the numbers of the grid's groups
+    std::string Caption;  // "Нето тегло"
+    std::string Field;    // the head field, "WeightNeto"
+    AttribEditor Editor = AttribEditor::Entry;
+    std::string Format;  // an entry's number format ("#,##0.000#####", "General Number")
+    // FixedList: "0|(Няма)|1|На база обем|2|На база тегло", value then text.
+    std::string Values;
+    // Selector: the head field holding the shown name ("SecItmName").
+    std::string ShownField;
+    std::string Help;  // shown under the grid while the row is chosen
+};
+
+struct AttribEvents {
+    // A value the person entered or chose, before it is written to the head;
+    // a handler may change Value or cancel (the old value stays).
+    std::function<void(const std::string& Field, pelta::Variant& Value, bool& Cancel)> BeforeUpdate;
+    std::function<void(const std::string& Field)> AfterUpdate;
+    // The button of a selector row: the screen picks the record and sets the
+    // value and its shown name (UserSetValue, SetShownText).
+    std::function<void(const std::string& Field)> ButtonClick;
+    // A row is drawn: the screen may change the shown text and give a style
+    // ("Inactive", "Required").
+    std::function<void(const std::string& Field, std::string& Text, std::string& Style)> RowFormat;
+    std::function<void(const std::string& Field)> SelChange;
+};
+
+class IAttribGridExtender : public virtual pelta::Object {
+public:
+    virtual AttribEvents& Events() = 0;
+    // `Groups` "1|Основни|2|Мерки|...": numbers and captions in their order.
+    virtual void Init(pelta::Object* Owner, const std::string& GridName,
+                      const std::string& Groups) = 0;
+    virtual std::string GridName() = 0;
+    // Raises InvalidProcedureCall for a field declared twice or an unknown group.
+    virtual void AddAttribute(const AttribDecl& Attribute) = 0;
+    virtual std::vector<AttribDecl> Attributes() = 0;
+    // The rows a list or tree attribute offers; a tree names its parent field.
+    virtual void SetList(const std::string& Field, RecordsetRef Rows, const std::string& KeyField,
+                         const std::string& ShownField, const std::string& ParentField = {}) = 0;
+    // The head whose current row holds the values; clears the edit state.
+    virtual void Bind(RecordsetRef Head) = 0;
+    virtual pelta::Variant Value(const std::string& Field) = 0;
+    // As the person enters it: converted to the head field's type (a number
+    // typed as text, a list's key), BeforeUpdate, written, AfterUpdate. False
+    // when refused (not a number, not among the list's rows, cancelled).
+    virtual bool UserSetValue(const std::string& Field, const pelta::Variant& Value) = 0;
+    // The screen's own change: written without events or edit state.
+    virtual void SetValue(const std::string& Field, const pelta::Variant& Value) = 0;
+    // The value as the row shows it: the list's or fixed list's text, the
+    // selector's shown name, a number in its format, after RowFormat.
+    virtual std::string ShownText(const std::string& Field) = 0;
+    // Writes a selector's shown name into its ShownField.
+    virtual void SetShownText(const std::string& Field, const std::string& Text) = 0;
+    // True when the person changed a value since Bind or ResetEditState.
+    virtual bool EditState() = 0;
+    virtual void ResetEditState() = 0;
+    virtual std::string SelectedField() = 0;
+    // Chooses a row (a message points the person at it); raises SelChange.
+    virtual void Select(const std::string& Field) = 0;
+    // The chosen row's help text.
+    virtual std::string HelpText() = 0;
+};
+
 }  // namespace PeltaNom15

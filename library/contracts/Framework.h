@@ -124,5 +124,6 @@ inline constexpr const char* kProgIdReportExtender = "PeltaCm15.ReportExtender";
 inline constexpr const char* kProgIdFieldExtender = "PeltaCm15.FieldExtender";
 inline constexpr const char* kProgIdFilterBandExtender = "PeltaCm15.FilterBandExtender";
 inline constexpr const char* kProgIdCacheDefExtender = "PeltaCm15.CacheDefExtender";
+inline constexpr const char* kProgIdAttribGridExtender = "PeltaCm15.AttribGridExtender";
 
 }  // namespace PeltaNom15
