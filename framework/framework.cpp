@@ -47,22 +47,38 @@ const ClassOf kClasses[] = {
      [] { return pelta::ObjectRef(pelta::makeRef<SiblingReport>(kProgIdStoLedgerItem)); }},
 };
 
+// Document lists of the sibling libraries, opened filtered by an item.
+const char* const kSiblingLists[] = {
+    "PeltaTrade15.ctxInvDocuments",    "PeltaTrade15.ctxSupDocuments",
+    "PeltaCrm15.ctxReqDocuments",      "PeltaTrade15.ctxStoDocuments",
+    "PeltaTrade15.ctxStoRevDocuments", "PeltaTrade15.ctxWcaDocuments",
+    "PeltaAcc15.ctxAccDocuments",      "PeltaCrm15.ctxConDocuments",
+    "PeltaCrm15.ctxMrpDocuments",
+};
+
 }  // namespace
 
 void registerFramework() {
     for (const auto& c : kClasses)
         pelta::registerLocalClass(c.progId, c.create);
+    for (const char* progId : kSiblingLists)
+        pelta::registerLocalClass(
+            progId, [progId] { return pelta::ObjectRef(pelta::makeRef<SiblingForm>(progId)); });
 }
 
 void unregisterFramework() {
     for (const auto& c : kClasses)
         pelta::unregisterLocalClass(c.progId);
+    for (const char* progId : kSiblingLists)
+        pelta::unregisterLocalClass(progId);
 }
 
 std::vector<std::string> frameworkProgIds() {
     std::vector<std::string> out;
     for (const auto& c : kClasses)
         out.emplace_back(c.progId);
+    for (const char* progId : kSiblingLists)
+        out.emplace_back(progId);
     return out;
 }
 

@@ -377,6 +377,9 @@ void GridExtender::addRow() {
     if (!view_)
         pelta::raise(pelta::errc::ObjectVariableNotSet, "No rows are bound to " + gridName_);
     view_->addNew();
+    // A row added while one group is shown belongs to that group.
+    if (!groupColumn_.empty() && !showsAllGroups(groupValue_))
+        view_->setValue(groupColumn_, groupValue_);
 }
 
 bool GridExtender::commitRow() {

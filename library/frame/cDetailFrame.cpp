@@ -69,6 +69,12 @@ bool cDetailFrame::frInit(IClientSite* Site) {
         m_oForm->SetClientSite(Site);
         m_oForm->SetLayoutKey(m_oDef.LayoutKey);
         m_oForm->DeclareControls(m_oDef.Controls);
+        if (!m_oDef.Attributes.empty()) {
+            m_oAttribExt = CreateAttribGridExtender(this, m_oDef.AttribGrid, m_oDef.AttribGroups);
+            if (!m_oAttribExt) return false;
+            for (const AttribDecl& a : m_oDef.Attributes)
+                m_oAttribExt->AddAttribute(a);
+        }
         m_oDetailOpener = CreateDetailOpener(Site, m_oDef.LayoutKey, m_oDef.ListName);
         if (!m_oDetailOpener) return false;
 
@@ -160,6 +166,7 @@ void cDetailFrame::m_oForm_Fetch(int32_t Step, bool& Cancel) {
             m_rsHead->update();
         }
         m_rsHead->moveFirst();
+        pvBindAttributes();
     } catch (...) {
         Cancel = true;
         ShowError("m_oForm_Fetch", m_oDef.ObjectName, m_oDef.Caption);
@@ -174,6 +181,7 @@ void cDetailFrame::m_oForm_FillControls() {
             if (c.Field.empty() || m_rsHead->fieldIndex(c.Field) < 0) continue;
             m_oForm->SetControlValue(c.Name, m_rsHead->value(c.Field));
         }
+        pvBindAttributes();
         pvFillControls();
     } catch (...) {
         PrintError("m_oForm_FillControls", m_oDef.ObjectName);
@@ -184,6 +192,19 @@ pelta::Variant cDetailFrame::pvControlField(const std::string& ControlName) {
     pelta::Variant v = m_oForm->ControlValue(ControlName);
     if (v.isEmpty() || (v.isString() && v.str().empty())) return pelta::Variant::null();
     return v;
+}
+
+// The attributes edit the head in place: bound again to each new head.
+void cDetailFrame::pvBindAttributes() {
+    if (!m_oAttribExt || !m_rsHead || m_rsAttribHead == m_rsHead) return;
+    m_rsAttribHead = m_rsHead;
+    m_oAttribExt->Bind(m_rsHead);
+}
+
+void cDetailFrame::pvShowAttribMessage(const std::string& Field, const std::string& Text,
+                                       const std::string& Title, const std::string& Hint) {
+    if (m_oAttribExt) m_oAttribExt->Select(Field);
+    m_oForm->ShowMessage(m_oDef.AttribGrid, Text, Title, Hint);
 }
 
 bool cDetailFrame::SameValue(const pelta::Variant& A, const pelta::Variant& B) {
@@ -211,6 +232,7 @@ bool cDetailFrame::pvModified() {
         }
         if (!SameValue(m_oForm->ControlValue(c.Name), m_rsHead->value(c.Field))) return true;
     }
+    if (m_oAttribExt && m_oAttribExt->EditState()) return true;
     return pvIsModified();
 }
 
@@ -293,6 +315,7 @@ void cDetailFrame::m_oForm_Save(bool& Cancel) {
         m_rsHead->moveFirst();
         m_sKey = C2Str(m_rsHead->value(m_oDef.KeyField));
         pvTakeResponse(*response, false);
+        pvBindAttributes();
         if (m_fnRowSaved) m_fnRowSaved(listRow);
     } catch (...) {
         Cancel = true;
@@ -355,6 +378,9 @@ void cDetailFrame::Terminate() {
         for (auto& [name, grid] : m_oGrids)
             grid->Events() = {};
         m_oGrids.clear();
+        if (m_oAttribExt) m_oAttribExt->Events() = {};
+        m_oAttribExt.reset();
+        m_rsAttribHead.reset();
         m_oRows.clear();
         m_oRefs.clear();
         if (m_oForm) m_oForm->Events() = {};

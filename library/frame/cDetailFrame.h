@@ -38,6 +38,11 @@ struct DetailDefinition {
     std::vector<ControlDecl> Controls;
     // Head fields whose control IsModified compares; empty: every bound field.
     std::vector<std::string> ModifiedFields;
+    // Further head fields edited in an attribute grid of that name, in the
+    // numbered groups "1|Основни|2|...".
+    std::string AttribGrid;
+    std::string AttribGroups;
+    std::vector<AttribDecl> Attributes;
 };
 
 class cDetailFrame : public LibForm, public IDetailForm, public IZonTerminate {
@@ -53,6 +58,13 @@ public:
     void QueryTerminate(bool& Cancel) override;
     void Terminate() override;
 
+    // A row grid of the form: its control, help number and columns.
+    struct GridDecl {
+        const char* Control;
+        int32_t HelpID;
+        std::vector<ColumnDecl> Columns;
+    };
+
     const std::string& Key() const noexcept { return m_sKey; }
     RecordsetRef Head() const;
     // The form's row grids by control name, its sub-lists and reference
@@ -60,6 +72,8 @@ public:
     IGridExtender* Grid(const std::string& ControlName) const;
     RecordsetRef Rows(const std::string& SubList) const;
     RecordsetRef Reference(const std::string& Name) const;
+    // The attribute grid; null when the form has no attributes.
+    IAttribGridExtender* Attributes() const { return m_oAttribExt.get(); }
 
 protected:
     explicit cDetailFrame(DetailDefinition Def);
@@ -104,15 +118,14 @@ protected:
     }
 
     // ---- shared ----
-    // A row grid of the form: its control, help number and columns.
-    struct GridDecl {
-        const char* Control;
-        int32_t HelpID;
-        std::vector<ColumnDecl> Columns;
-    };
     // Creates the grids and keeps them by control name; False when one fails.
     bool pvCreateGrids(std::span<const GridDecl> Grids);
     bool pvHasRight(int32_t RightFlag);
+    // Whether the shown record has edits not saved yet.
+    bool pvModified();
+    // A message about an attribute: its row is chosen first.
+    void pvShowAttribMessage(const std::string& Field, const std::string& Text,
+                             const std::string& Title = {}, const std::string& Hint = {});
     // The value of a control as a head field takes it: Null for an empty one.
     pelta::Variant pvControlField(const std::string& ControlName);
     // Equality as an edit sees it: empty and Null alike, texts by content.
@@ -126,6 +139,7 @@ protected:
     std::string m_sKey;
     RecordsetRef m_rsHead;
     std::map<std::string, pelta::Ref<IGridExtender>> m_oGrids;  // by control name
+    pelta::Ref<IAttribGridExtender> m_oAttribExt;               // null without attributes
     std::map<std::string, RecordsetRef> m_oRows;                // sub-lists by name
     std::map<std::string, RecordsetRef> m_oRefs;                // reference lists by name
     int32_t m_lInstanceID = 0;
@@ -140,8 +154,9 @@ private:
     void m_oForm_QueryStandalone(bool& Cancel);
     void m_oForm_BeforeExecute(int32_t CommandID, bool& Handled);
     void pvDelete();
-    bool pvModified();
+    void pvBindAttributes();
 
+    RecordsetRef m_rsAttribHead;  // the head the attributes are bound to
     std::function<void(RecordsetRef)> m_fnRowSaved;
     std::function<void()> m_fnRecordDeleted;
 };

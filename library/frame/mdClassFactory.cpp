@@ -138,6 +138,14 @@ pelta::Ref<ITreeExtender> CreateTreeExtender(pelta::Object* Owner, const std::st
                                [&](ITreeExtender& x) { x.Init(Owner, TreeName, HelpID); });
 }
 
+pelta::Ref<IAttribGridExtender> CreateAttribGridExtender(pelta::Object* Owner,
+                                                         const std::string& GridName,
+                                                         const std::string& Groups) {
+    return make<IAttribGridExtender>(
+        kProgIdAttribGridExtender, "CreateAttribGridExtender",
+        [&](IAttribGridExtender& x) { x.Init(Owner, GridName, Groups); });
+}
+
 pelta::Ref<ISplitterExtender> CreateSplitterExtender(pelta::Object* Owner,
                                                      const std::string& SettingName,
                                                      double Default) {

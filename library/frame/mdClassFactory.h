@@ -38,6 +38,10 @@ pelta::Ref<IDetailOpener> CreateDetailOpener(IClientSite* Site, const std::strin
                                              const std::string& ScreenName);
 pelta::Ref<ITreeExtender> CreateTreeExtender(pelta::Object* Owner, const std::string& TreeName,
                                              int32_t HelpID = 0);
+// `Groups` "1|Основни|2|Мерки|...".
+pelta::Ref<IAttribGridExtender> CreateAttribGridExtender(pelta::Object* Owner,
+                                                         const std::string& GridName,
+                                                         const std::string& Groups);
 pelta::Ref<ISplitterExtender> CreateSplitterExtender(pelta::Object* Owner,
                                                      const std::string& SettingName,
                                                      double Default);

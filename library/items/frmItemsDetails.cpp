@@ -9,12 +9,16 @@
 #include "library/frame/mdClassFactory.h"
 #include "library/frame/mdErrorHandling.h"
 #include "library/frame/mdGlobals.h"
+#include "library/items/frmItemsAttribs.h"
 #include "platform/automation/error.h"
 #include "platform/automation/guid.h"
 #include "platform/data/propertybag.h"
 #include "platform/data/recordset.h"
 
 namespace PeltaNom15 {
+
+// The tree of lists and its grids (frmItemsDetailsLists.cpp).
+std::vector<ControlDecl> ItemListControls();
 
 namespace {
 
@@ -24,49 +28,7 @@ constexpr const char* kCodeHint =
     "Използвайте текстовото поле, за да модифицирате кода или го оставете празно за автоматична "
     "генерация на пореден уникален номер.";
 constexpr const char* kNameHint = "Използвайте текстовото поле, за да модифицирате името.";
-
-struct Attribute {
-    const char* Field;
-    ControlKind Kind;
-    const char* Caption;
-    const char* Group;
-    const char* Format;
-    const char* Reference;  // the reference list of a combo
-};
-
-// The attributes kept on the item that this form edits.
-const Attribute kAttributes[] = {
-    {"Name2", ControlKind::Text, "Допълнително име", "Основни", "", ""},
-    {"DefCurrency_ID", ControlKind::Combo, "Валута по подразбиране", "Основни", "", "Currency"},
-    {"SecMeasure_ID", ControlKind::Combo, "Допълнителна мярка", "Основни", "", "Measure"},
-    {"WeightNeto", ControlKind::Number, "Нето тегло", "Мерки", "#,##0.000#####", ""},
-    {"WeightBruto", ControlKind::Number, "Бруто тегло", "Мерки", "#,##0.000#####", ""},
-    {"BasicMeasureScale", ControlKind::Number, "Прецизност в осн. мярка", "Мерки", "#,##0", ""},
-    {"VatPriceScale", ControlKind::Number, "Прецизност крайна цена с ДДС", "Мерки", "#,##0", ""},
-    {"PriceScale", ControlKind::Number, "Прецизност крайна цена с TO%", "Мерки", "#,##0", ""},
-    {"SecMeasure2_ID", ControlKind::Combo, "Мярка", "Трансформиране при фактуриране", "",
-     "Measure"},
-    {"IsRatePrice", ControlKind::CheckBox, "Използва за заприходяване в склада", "Нормативна цена",
-     "", ""},
-    {"Vat", ControlKind::Number, "ДДС ставка", "Данъци и такси", "General Number", ""},
-    {"Excise", ControlKind::Number, "Акциз за осн. мярка", "Данъци и такси", "", ""},
-    {"IsVatAllowed", ControlKind::CheckBox, "Разрешено включване ДДС в цената", "Данъци и такси",
-     "", ""},
-    {"TaxGroup", ControlKind::Combo, "Данъчна група за касова бележка", "Отпечатване", "", ""},
-    {"Permit", ControlKind::Text, "Разрешително", "Отпечатване", "", ""},
-    {"Concentration", ControlKind::Text, "Концентрация", "Отпечатване", "", ""},
-    {"MarginalPriceVat", ControlKind::Number, "Пределна цена с ДДС", "Отпечатване",
-     "#,##0.00######", ""},
-    {"PriceGroup", ControlKind::Text, "Ценова група", "Отпечатване", "General Number", ""},
-    {"FinStruct_ID", ControlKind::Combo, "Направление", "Центрове на себестойност при продажби", "",
-     "FinStruct"},
-    {"MinOrderQuo", ControlKind::Number, "Минимално кол. за заявка", "Други", "#,##0.0#######", ""},
-    {"Priority", ControlKind::Number, "Приоритет", "Други", "#,##0.0#######", ""},
-};
-
-std::string AttributeControl(const char* Field) {
-    return std::string("att") + Field;
-}
+constexpr const char* kAttribGrid = "geAttribs";
 
 DetailDefinition ItemsDetails() {
     DetailDefinition d;
@@ -93,16 +55,13 @@ DetailDefinition ItemsDetails() {
                 "Общи"),
         Control("txtNote", ControlKind::Note, " Забележка", "Note", "Общи"),
         Control("rchNoteRtf", ControlKind::RichText, " Забележка", "NoteRtf", "Общи"),
-        Control("geMeasures", ControlKind::Grid, "Фасети на мерки", {}, "Фасети на мерки"),
-        Control("geBarCodes", ControlKind::Grid, "Баркодове", {}, "Баркодове"),
-        Control("geItemsCodes", ControlKind::Grid, "Вендор кодове/имена", {},
-                "Вендор кодове/имена"),
     };
-    for (const Attribute& a : kAttributes) {
-        ControlDecl c = Control(AttributeControl(a.Field), a.Kind, a.Caption, a.Field, a.Group);
-        c.Format = a.Format;
+    for (ControlDecl& c : ItemListControls())
         d.Controls.push_back(std::move(c));
-    }
+    d.AttribGrid = kAttribGrid;
+    d.AttribGroups = kItemAttribGroups;
+    for (const ItemAttribute& a : ItemAttributes())
+        d.Attributes.push_back(a.Decl);
     return d;
 }
 
@@ -141,43 +100,20 @@ const std::vector<std::string>& frmItemsDetails::SubLists() {
     return names;
 }
 
-bool frmItemsDetails::BomNameTaken(const RecordsetRef& Boms, const std::string& Name) {
-    if (!Boms || Boms->recordCount() == 0 || Boms->fieldIndex("Name") < 0) return false;
-    auto b = Boms->clone();
-    return b->find("Name='" + SqlQuote(Name) + "'");
-}
-
 bool frmItemsDetails::pvInitForm() {
-    const GridDecl grids[] = {
-        {"geMeasures",
-         2111,
-         {Column("Measure_ID", "Мярка", EditorKind::Combo),
-          Column("Ratio", "Отношение", EditorKind::Text),
-          Column("ID", "ID", EditorKind::None, false)}},
-        {"geBarCodes",
-         2112,
-         {Column("BarCode", "Баркод", EditorKind::Text),
-          Column("Measure_ID", "Мярка", EditorKind::Combo),
-          Column("ID", "ID", EditorKind::None, false)}},
-        {"geItemsCodes",
-         2113,
-         {Column("Code", "Код", EditorKind::Text), Column("Measure_ID", "Мярка", EditorKind::Combo),
-          Column("ID", "ID", EditorKind::None, false)}},
+    if (!pvCreateLists()) return false;
+    m_oAttribExt->Events().ButtonClick = [this](const std::string& Field) {
+        try {
+            pvPickAttribute(Field);
+        } catch (...) {
+            ShowError("m_oAttribExt_ButtonClick", kObjectName, m_oDef.Caption);
+        }
     };
-    if (!pvCreateGrids(grids)) return false;
-    auto groups = pelta::makeRef<pelta::Recordset>();
-    groups->appendField("ID", pelta::FieldType::Long);
-    groups->appendField("Name", pelta::FieldType::Text);
-    groups->open();
-    int32_t n = 0;
-    for (const char* name : {"А", "Б", "В", "Г"}) {
-        groups->addNew();
-        groups->setValue("ID", pelta::Variant(++n));
-        groups->setValue("Name", pelta::Variant(name));
-        groups->update();
-    }
-    groups->updateBatch();
-    m_oForm->SetControlList(AttributeControl("TaxGroup"), groups, "ID", {"Name"});
+    m_oForm->AddCommand(117, "Нова рецепта...\tCtrl+Shift+N", "Рецепти");
+    m_oForm->AddCommand(243, "Редакция...\tF2", "Рецепти");
+    m_oForm->AddCommand(310, "Дублиране\tCtrl+D", "Рецепти");
+    m_oForm->AddCommand(340, "Актуализация цени на рецепта", "Рецепти");
+    m_oForm->AddCommand(323, "Актуализация цени на съставки на рецепта", "Рецепти");
     return true;
 }
 
@@ -186,9 +122,9 @@ void frmItemsDetails::pvTakeResponse(pelta::PropertyBag& Response, bool Fetched)
         m_oRows[name] = RecordsetProperty(&Response, name);
     m_oRows["ItemLotsSaldo"] = RecordsetProperty(&Response, "ItemLotsSaldo");
     static const char* const kReferences[] = {
-        "ItemType",    "Measure",    "PriceListType", "Currency", "Store",
-        "Dimensions",  "DimValues",  "Shelves",       "Groups",   "Items",
-        "StateActive", "CostCenter", "DutyTariffs",   "FinStruct"};
+        "ItemType",    "Measure",    "PriceListType", "Currency",  "Store",
+        "Dimensions",  "DimValues",  "Shelves",       "Groups",    "Items",
+        "StateActive", "CostCenter", "DutyTariffs",   "FinStruct", "Intrastat"};
     bool any = false;
     for (const char* name : kReferences)
         if (auto rs = RecordsetProperty(&Response, name)) {
@@ -205,11 +141,19 @@ void frmItemsDetails::pvTakeResponse(pelta::PropertyBag& Response, bool Fetched)
         list("cboMeasure", "Measure");
         list("cboStore", "Store");
         list("cboGroup", "DimValues");
-        for (const Attribute& a : kAttributes)
-            if (*a.Reference) list(AttributeControl(a.Field), a.Reference);
+        for (const ItemAttribute& a : ItemAttributes()) {
+            auto rs = *a.Reference ? Reference(a.Reference) : RecordsetRef();
+            if (!rs || rs->fieldIndex("ID") < 0 || rs->fieldIndex("Name") < 0) continue;
+            const bool tree =
+                a.Decl.Editor == AttribEditor::TreeList && rs->fieldIndex("P_ID") >= 0;
+            m_oAttribExt->SetList(a.Decl.Field, rs, "ID", "Name", tree ? "P_ID" : "");
+        }
+        pvSetLists();
     }
     if (Fetched) m_bFromCopy = false;
     m_bUploaded = false;
+    // After a save the lists are the saved ones: the tree shows them again.
+    if (!Fetched) pvBuildTree();
 }
 
 pelta::Variant frmItemsDetails::pvParameter(const char* Name) {
@@ -245,9 +189,12 @@ void frmItemsDetails::pvNewRecord() {
         if (auto measures = Rows("ItemsMeasures"); measures && m_oCopy->Measures)
             ForLiveRows(m_oCopy->Measures, [&](pelta::Recordset& r) {
                 measures->addNew();
+                for (size_t i = 0; i < measures->fieldCount(); ++i) {
+                    const std::string& field = measures->fieldDef(i).name;
+                    if (field != "Itm_ID" && !IsAudit(field) && r.fieldIndex(field) >= 0)
+                        measures->setValue(field, r.value(field));
+                }
                 measures->setValue("ID", pelta::Variant(pelta::newGuidString()));
-                measures->setValue("Measure_ID", r.value("Measure_ID"));
-                measures->setValue("Ratio", r.value("Ratio"));
                 measures->update();
             });
         return;
@@ -266,7 +213,6 @@ void frmItemsDetails::pvNewRecord() {
     }
     set("Measure_ID", pvDefault("Measure"));
     set("Currency_ID", pvDefault("Currency"));
-    set("DefCurrency_ID", pvDefault("Currency"));
     set("Intrastat_ID", pvDefault("Intrastat", "IsDefault"));
     set("TaxGroup", pelta::Variant(2));
     set("Vat", pvParameter("Vat"));
@@ -277,11 +223,11 @@ void frmItemsDetails::pvNewRecord() {
 }
 
 void frmItemsDetails::pvFillControls() {
-    for (const auto& [control, rows] :
-         std::map<std::string, std::string>{{"geMeasures", "ItemsMeasures"},
-                                            {"geBarCodes", "BarCodes"},
-                                            {"geItemsCodes", "ItemsCodes"}})
-        if (auto rs = Rows(rows)) m_oGrids[control]->Bind(rs);
+    pvBuildTree();
+}
+
+std::string frmItemsDetails::pvAttribute(const char* Field) {
+    return m_oAttribExt ? C2Str(m_oAttribExt->Value(Field)) : std::string();
 }
 
 bool frmItemsDetails::pvIsModified() {
@@ -324,15 +270,14 @@ bool frmItemsDetails::pvCheckHead() {
     }
     // A second measure needs its ratio among the measure facets.
     for (const char* field : {"SecMeasure_ID", "SecMeasure2_ID"}) {
-        const std::string control = AttributeControl(field);
-        const std::string measure = pvText(control);
+        const std::string measure = pvAttribute(field);
         if (measure.empty()) continue;
         bool found = false;
         ForLiveRows(Rows("ItemsMeasures"), [&](pelta::Recordset& r) {
             found = found || C2Str(r.value("Measure_ID")) == measure;
         });
         if (!found) {
-            m_oForm->ShowMessage(control, "Моля въведете валидно отношение м/у мерките");
+            pvShowAttribMessage(field, "Моля въведете валидно отношение м/у мерките");
             return false;
         }
     }
@@ -344,8 +289,7 @@ bool frmItemsDetails::pvCheckHead() {
     for (const Scale& s : {Scale{"BasicMeasureScale", "Прецизност в осн. мярка", 4},
                            Scale{"VatPriceScale", "Прецизност крайна цена с ДДС", 8},
                            Scale{"PriceScale", "Прецизност крайна цена с TO%", 8}}) {
-        const std::string control = AttributeControl(s.Field);
-        const pelta::Variant v = m_oForm->ControlValue(control);
+        const pelta::Variant v = m_oAttribExt->Value(s.Field);
         if (v.isEmpty() || v.isNull() || (v.isString() && Trim(v.str()).empty())) continue;
         bool valid = true;
         try {
@@ -355,23 +299,23 @@ bool frmItemsDetails::pvCheckHead() {
             valid = false;
         }
         if (!valid) {
-            m_oForm->ShowMessage(control, Printf("Стойността на полето '%1' трябва да е между 0 и "
-                                                 "%2.",
-                                                 std::string(s.Caption), s.High));
+            pvShowAttribMessage(s.Field, Printf("Стойността на полето '%1' трябва да е между 0 и "
+                                                "%2.",
+                                                std::string(s.Caption), s.High));
             return false;
         }
     }
     // Only leaves of the directions may be chosen.
-    const std::string direction = pvText(AttributeControl("FinStruct_ID"));
+    const std::string direction = pvAttribute("FinStruct_ID");
     if (auto fin = Reference("FinStruct"); !direction.empty() && fin && fin->recordCount() > 0) {
         auto f = fin->clone();
         if (f->find("P_ID = '" + SqlQuote(direction) + "'")) {
-            m_oForm->ShowMessage(AttributeControl("FinStruct_ID"),
-                                 "Могат да се избират само крайни разклонения от списъка. "
-                                 "Междинните възли в структурата не са позволени за избор.",
-                                 "Невалидно направление",
-                                 "Използвайте падащия списък, за да изберете елемент без "
-                                 "наследници в йерархията с направления.");
+            pvShowAttribMessage("FinStruct_ID",
+                                "Могат да се избират само крайни разклонения от списъка. "
+                                "Междинните възли в структурата не са позволени за избор.",
+                                "Невалидно направление",
+                                "Използвайте падащия списък, за да изберете елемент без "
+                                "наследници в йерархията с направления.");
             return false;
         }
     }
@@ -504,7 +448,11 @@ frmItemsDetails::SaveRefusal frmItemsDetails::pvSaveRefused(pelta::PropertyBag& 
 }
 
 bool frmItemsDetails::pvExecute(int32_t CommandID) {
-    if (CommandID != kCmdCopy) return false;
+    if (CommandID == kCmdCopy) return pvCopy();
+    return pvBomCommand(CommandID);
+}
+
+bool frmItemsDetails::pvCopy() {
     if (!m_rsHead || m_rsHead->recordCount() == 0) return true;
     // The item as the controls show it, without what makes it itself.
     CopySource copy;
@@ -529,6 +477,10 @@ bool frmItemsDetails::pvExecute(int32_t CommandID) {
 
 void frmItemsDetails::Terminate() {
     m_oCopy.reset();
+    if (m_oTreeExt) m_oTreeExt->Events() = {};
+    m_oTreeExt.reset();
+    m_oBound.clear();
+    m_oDocs.clear();
     cDetailFrame::Terminate();
 }
 

@@ -1,6 +1,7 @@
-// One product, material or service: its head, the attributes kept on it, and
-// the lists saved with it (measure facets, barcodes, suppliers' codes and
-// the lists of other parts of the system), all in one call.
+// One product, material or service: its head and attributes, the tree of
+// the lists kept with it (price lists, measure facets, barcodes, bills of
+// materials and the others), and the documents of the suite in which it
+// occurs; everything is saved in one call.
 #pragma once
 
 #include <map>
@@ -18,13 +19,23 @@ public:
 
     // The sub-lists in the order the service takes them.
     static const std::vector<std::string>& SubLists();
-    // Whether a bill of materials of that name is among `Boms` already.
-    static bool BomNameTaken(const RecordsetRef& Boms, const std::string& Name);
+    // Whether a bill of materials of that name is among `Boms` already
+    // (`Except` is the bill being renamed).
+    static bool BomNameTaken(const RecordsetRef& Boms, const std::string& Name,
+                             const std::string& Except = {});
 
-    // What hosts drive and show.
+    // The tree of lists: node keys are the captions, but for the price
+    // lists ("PriceList"), the bills ("Bom:" + ID) and the placeholder of a
+    // new bill.
+    ITreeExtender* Tree() const { return m_oTreeExt.get(); }
+    static constexpr const char* kNewBomNode = "__empty__Bom";
+    // The list control of another library opened by a document node.
+    pelta::ObjectRef DocumentList(const std::string& NodeKey) const;
+
     void Terminate() override;
 
 private:
+    // the record and its lifecycle
     bool pvInitForm() override;
     void pvTakeResponse(pelta::PropertyBag& Response, bool Fetched) override;
     void pvNewRecord() override;
@@ -39,9 +50,32 @@ private:
 
     bool pvCheckHead();
     bool pvCheckLists();
+    bool pvCopy();
     pelta::Variant pvParameter(const char* Name);
     std::string pvText(const std::string& ControlName);
+    std::string pvAttribute(const char* Field);
     pelta::Variant pvDefault(const char* Reference, const char* Flag = "IsDef");
+
+    // the tree of lists (frmItemsDetailsLists.cpp)
+    bool pvCreateLists();
+    void pvSetLists();
+    void pvBuildTree();
+    void pvNodeActivate(const std::string& Key);
+    void pvRefreshLots();
+    void pvOpenDocuments(const std::string& NodeKey);
+    void pvProposePrices();
+    void pvPickAttribute(const std::string& Field);
+
+    // bills of materials (frmItemsDetailsBoms.cpp)
+    std::string pvBomOfNode(const std::string& Key) const;
+    void pvBomNodes();
+    bool pvBomCommand(int32_t CommandID);
+    void pvNewBom();
+    void pvRenameBom();
+    void pvCopyBom();
+    void pvDeleteBom();
+    void pvBomPrices();
+    void pvEnableBomCommands();
 
     // The item a copy (318) is made of: its head values and measure facets.
     struct CopySource {
@@ -51,6 +85,12 @@ private:
     std::optional<CopySource> m_oCopy;
     bool m_bFromCopy = false;
     bool m_bUploaded = false;  // the head holds the controls' values of a save
+
+    pelta::Ref<ITreeExtender> m_oTreeExt;
+    std::string m_sNode;                              // the chosen node
+    std::string m_sBom;                               // the last bill of materials shown
+    std::map<std::string, RecordsetRef> m_oBound;     // grid control → the rows it shows
+    std::map<std::string, pelta::ObjectRef> m_oDocs;  // document node → list control
 };
 
 }  // namespace PeltaNom15

@@ -83,22 +83,23 @@ TEST_F(ItemDetailsTest, ANewProductStartsWithItsDefaultsAndTheServiceNumbersIt) 
     EXPECT_TRUE(d->Key().empty());
     auto head = d->Head();
     EXPECT_TRUE(IsGuid(C2Str(head->value("ID"))));
-    for (const char* c : {"chkIsActive", "chkIsAccQuo", "chkIsAccPr", "attIsVatAllowed"})
+    for (const char* c : {"chkIsActive", "chkIsAccQuo", "chkIsAccPr"})
         EXPECT_TRUE(C2Bool(f(d)->ControlValue(c))) << c;
+    EXPECT_TRUE(C2Bool(d->Attributes()->Value("IsVatAllowed")));
     EXPECT_EQ(C2Str(f(d)->ControlValue("cboItmType")), idOf("nom_itemtypes", "Name", "Стока"));
     EXPECT_FALSE(C2Bool(head->value("IsService")));
     EXPECT_EQ(C2Str(f(d)->ControlValue("cboMeasure")), measure("бр"));
     EXPECT_EQ(C2Str(f(d)->ControlValue("cboStore")), idOf("nom_stores", "Code", "1"));
-    EXPECT_EQ(C2Str(f(d)->ControlValue("attDefCurrency_ID")),
+    EXPECT_EQ(C2Str(d->Attributes()->Value("Currency_ID")),
               text("SELECT Value FROM sys_settings WHERE Name = 'DefCurrency_ID'"));
-    EXPECT_EQ(C2Lng(f(d)->ControlValue("attTaxGroup")), 2);
-    EXPECT_EQ(C2Str(f(d)->ControlValue("attVat")), "20");
-    EXPECT_EQ(C2Lng(f(d)->ControlValue("attPriceScale")), 2);
+    EXPECT_EQ(C2Lng(d->Attributes()->Value("TaxGroup")), 2);
+    EXPECT_EQ(d->Attributes()->ShownText("TaxGroup"), "Б");
+    EXPECT_EQ(C2Str(d->Attributes()->Value("Vat")), "20");
+    EXPECT_EQ(C2Lng(d->Attributes()->Value("PriceScale")), 2);
     EXPECT_EQ(C2Str(head->value("CU")), connection->CurrentUserID());
     EXPECT_EQ(C2Str(f(d)->ControlValue("txtCode")), "");
     EXPECT_FALSE(f(d)->isModified()) << "an untouched new item closes without asking";
     EXPECT_NE(f(d)->controlList("cboItmType"), nullptr);
-    EXPECT_EQ(f(d)->controlList("attTaxGroup")->rows->recordCount(), 4);
 
     f(d)->userSetValue("txtName", pelta::Variant("Нов продукт за тест"));
     ASSERT_TRUE(d->FormExtender()->SaveDocument()) << agent->last().text;
@@ -124,6 +125,10 @@ TEST_F(ItemDetailsTest, ChecksComeInTheirOrderAndNothingIsSentUntilAllPass) {
         EXPECT_EQ(shown.text, message);
         return shown;
     };
+    auto expectAttribute = [&](const char* field, const std::string& message) {
+        expect("geAttribs", message);
+        EXPECT_EQ(d->Attributes()->SelectedField(), field);
+    };
     f(d)->userSetValue("txtCode", pelta::Variant("T-1"));
     expect("txtName", "Невалидно име");
     f(d)->userSetValue("txtName", pelta::Variant("  "));
@@ -139,29 +144,30 @@ TEST_F(ItemDetailsTest, ChecksComeInTheirOrderAndNothingIsSentUntilAllPass) {
     f(d)->userSetValue("cboGroup", pelta::Variant(idOf("nom_dimvalues", "Name", "Храни")));
 
     // A second measure needs its facet.
-    f(d)->userSetValue("attSecMeasure_ID", pelta::Variant(measure("кг")));
-    expect("attSecMeasure_ID", "Моля въведете валидно отношение м/у мерките");
+    d->Attributes()->UserSetValue("SecMeasure_ID", pelta::Variant(measure("кг")));
+    expectAttribute("SecMeasure_ID", "Моля въведете валидно отношение м/у мерките");
+    ASSERT_TRUE(d->Tree()->SelectNode("Фасети на мерки"));
     auto* mg = grid(d->Grid("geMeasures"));
     mg->addRow();
     mg->editCell("Measure_ID", pelta::Variant(measure("кг")));
     mg->editCell("Ratio", pelta::Variant(pelta::Decimal(5)));
     ASSERT_TRUE(mg->commitRow());
 
-    f(d)->userSetValue("attBasicMeasureScale", pelta::Variant(5));
-    expect("attBasicMeasureScale",
-           "Стойността на полето 'Прецизност в осн. мярка' трябва да е между 0 и 4.");
-    f(d)->userSetValue("attBasicMeasureScale", pelta::Variant(-1));
-    expect("attBasicMeasureScale",
-           "Стойността на полето 'Прецизност в осн. мярка' трябва да е между 0 и 4.");
-    f(d)->userSetValue("attBasicMeasureScale", pelta::Variant(4));
-    f(d)->userSetValue("attVatPriceScale", pelta::Variant(9));
-    expect("attVatPriceScale",
-           "Стойността на полето 'Прецизност крайна цена с ДДС' трябва да е между 0 и 8.");
-    f(d)->userSetValue("attVatPriceScale", pelta::Variant(2));
-    f(d)->userSetValue("attPriceScale", pelta::Variant("1.5"));
-    expect("attPriceScale",
-           "Стойността на полето 'Прецизност крайна цена с TO%' трябва да е между 0 и 8.");
-    f(d)->userSetValue("attPriceScale", pelta::Variant(0));
+    d->Attributes()->UserSetValue("BasicMeasureScale", pelta::Variant(5));
+    expectAttribute("BasicMeasureScale",
+                    "Стойността на полето 'Прецизност в осн. мярка' трябва да е между 0 и 4.");
+    d->Attributes()->UserSetValue("BasicMeasureScale", pelta::Variant(-1));
+    expectAttribute("BasicMeasureScale",
+                    "Стойността на полето 'Прецизност в осн. мярка' трябва да е между 0 и 4.");
+    d->Attributes()->UserSetValue("BasicMeasureScale", pelta::Variant(4));
+    d->Attributes()->UserSetValue("VatPriceScale", pelta::Variant(9));
+    expectAttribute("VatPriceScale",
+                    "Стойността на полето 'Прецизност крайна цена с ДДС' трябва да е между 0 и 8.");
+    d->Attributes()->UserSetValue("VatPriceScale", pelta::Variant(2));
+    d->Attributes()->UserSetValue("PriceScale", pelta::Variant("12"));
+    expectAttribute("PriceScale",
+                    "Стойността на полето 'Прецизност крайна цена с TO%' трябва да е между 0 и 8.");
+    d->Attributes()->UserSetValue("PriceScale", pelta::Variant(0));
 
     // A facet on the base measure itself.
     f(d)->userSetValue("cboMeasure", pelta::Variant(measure("кг")));
@@ -208,6 +214,7 @@ TEST_F(ItemDetailsTest, AnEditIsSavedAndTheListRowRefreshedWithoutReadingTheList
 
     // A barcode added in its grid reaches the item's code list.
     const int64_t had = d->Rows("BarCodes")->recordCount();
+    ASSERT_TRUE(d->Tree()->SelectNode("Баркодове"));
     auto* bg = grid(d->Grid("geBarCodes"));
     bg->addRow();
     bg->editCell("BarCode", pelta::Variant("3800000000017"));
@@ -250,6 +257,7 @@ TEST_F(ItemDetailsTest, DuplicatesAreToldByTheirKindAndTheEditsStay) {
     // A barcode another item holds names that item.
     addBarcode(code, "3800000000024");
     f(d)->userSetValue("txtName", pelta::Variant("Двойник"));
+    ASSERT_TRUE(d->Tree()->SelectNode("Баркодове"));
     auto* bg = grid(d->Grid("geBarCodes"));
     bg->addRow();
     bg->editCell("BarCode", pelta::Variant("3800000000024"));
@@ -346,9 +354,10 @@ TEST_F(ItemDetailsTest, OnlyALeafDirectionMayBeChosen) {
         directions->setValue("Name", pelta::Variant(name));
         directions->update();
     }
-    f(d)->userSetValue("attFinStruct_ID", pelta::Variant(parent));
+    d->Attributes()->UserSetValue("FinStruct_ID", pelta::Variant(parent));
     auto shown = refused(d);
-    EXPECT_EQ(shown.control, "attFinStruct_ID");
+    EXPECT_EQ(shown.control, "geAttribs");
+    EXPECT_EQ(d->Attributes()->SelectedField(), "FinStruct_ID");
     EXPECT_EQ(shown.title, "Невалидно направление");
     EXPECT_EQ(shown.text,
               "Могат да се избират само крайни разклонения от списъка. Междинните възли в "
@@ -356,7 +365,7 @@ TEST_F(ItemDetailsTest, OnlyALeafDirectionMayBeChosen) {
     EXPECT_EQ(shown.hint,
               "Използвайте падащия списък, за да изберете елемент без наследници в йерархията с "
               "направления.");
-    f(d)->userSetValue("attFinStruct_ID", pelta::Variant(leaf));
+    d->Attributes()->UserSetValue("FinStruct_ID", pelta::Variant(leaf));
     agent->clear();
     ASSERT_TRUE(d->FormExtender()->SaveDocument()) << agent->last().text;
     EXPECT_EQ(text("SELECT FinStruct_ID FROM nom_items WHERE ID = ?1", pelta::Variant(d->Key())),
