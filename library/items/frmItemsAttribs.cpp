@@ -21,9 +21,9 @@ constexpr const char* kSalePrint = "Използва се при печат на
 constexpr const char* kCostCenters =
     "Използва се за автоматично попълване на центрове на себестойност при продажби.";
 
-ItemAttribute A(int32_t Group, const char* Caption, const char* Field, E Editor,
-                const char* Help, const char* Format = "", const char* Reference = "",
-                const char* Values = "", const char* Shown = "") {
+ItemAttribute A(int32_t Group, const char* Caption, const char* Field, E Editor, const char* Help,
+                const char* Format = "", const char* Reference = "", const char* Values = "",
+                const char* Shown = "") {
     ItemAttribute a;
     a.Decl.Group = Group;
     a.Decl.Caption = Caption;
@@ -85,8 +85,7 @@ std::vector<ItemAttribute> Build() {
               "заявки.",
               kQuantityFormat),
         Entry(2, "Нето обем", "VolumeNeto",
-              "Използва се при ценообразуване на генерирани складови документи.",
-              kQuantityFormat),
+              "Използва се при ценообразуване на генерирани складови документи.", kQuantityFormat),
         Entry(2, "Бруто обем", "VolumeBruto",
               "Показва се в колоната бруто обем на търговските документи и при печат на "
               "заявки.",
@@ -179,8 +178,7 @@ std::vector<ItemAttribute> Build() {
         Entry(9, "Пределна цена с ДДС", "MarginalPriceVat", "Пределна цена с ДДС.", kPriceFormat),
         Entry(9, "Ценова група", "PriceGroup", "Ценова група.", "General Number"),
         // 10 Центрове на себестойност при продажби
-        Pick(10, "Структурен център на себестойност", "CcStruct_ID", "StructureName",
-             kCostCenters),
+        Pick(10, "Структурен център на себестойност", "CcStruct_ID", "StructureName", kCostCenters),
         Pick(10, "Обект/проект", "CcProject_ID", "ProjectName", kCostCenters),
         Pick(10, "Друг център на себестойност", "CcOther_ID", "OtherName", kCostCenters),
         A(10, "Направление", "FinStruct_ID", E::TreeList,

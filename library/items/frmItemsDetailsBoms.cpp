@@ -96,11 +96,11 @@ std::string AskBomName(IFormExtender& Form, const RecordsetRef& Boms, std::strin
         if (!Form.InputBox("Име на рецепта:", kBomTitle, value)) return {};
         std::string name = C2Str(value);
         const auto b = name.find_first_not_of(' ');
-        name = b == std::string::npos ? std::string() : name.substr(b, name.find_last_not_of(' ') - b + 1);
+        name = b == std::string::npos ? std::string()
+                                      : name.substr(b, name.find_last_not_of(' ') - b + 1);
         if (name.empty()) return {};
         if (!frmItemsDetails::BomNameTaken(Boms, name, Except)) return name;
-        Form.MsgBox(Printf("Вече съществува рецепта с име '%1'.", name), vbExclamation,
-                    kBomTitle);
+        Form.MsgBox(Printf("Вече съществува рецепта с име '%1'.", name), vbExclamation, kBomTitle);
         Default = name;
     }
 }
@@ -157,8 +157,7 @@ void frmItemsDetails::pvCopyBom() {
     if (bom.empty() || !boms) return;
     auto source = boms->clone();
     if (!source->find("ID='" + SqlQuote(bom) + "'")) return;
-    const std::string name =
-        AskBomName(*m_oForm, boms, C2Str(source->value("Name")) + " (2)", {});
+    const std::string name = AskBomName(*m_oForm, boms, C2Str(source->value("Name")) + " (2)", {});
     if (name.empty()) return;
     const std::string id = pelta::newGuidString();
     boms->addNew();
@@ -203,8 +202,7 @@ void frmItemsDetails::pvDeleteBom() {
     if (bom.empty() || !boms) return;
     auto b = boms->clone();
     if (!b->find("ID='" + SqlQuote(bom) + "'")) return;
-    if (m_oForm->AskYesNo(Printf("Желаете ли да изтриете '%1'?", C2Str(b->value("Name")))) !=
-        vbYes)
+    if (m_oForm->AskYesNo(Printf("Желаете ли да изтриете '%1'?", C2Str(b->value("Name")))) != vbYes)
         return;
     if (auto details = Rows("BomsDetails"); details && details->fieldIndex("Bom_ID") >= 0) {
         auto d = details->clone();
@@ -233,8 +231,7 @@ void frmItemsDetails::pvBomPrices() {
     if (Key().empty()) return;
     auto request = CreatePropertyBag(m_oForm.get());
     request->writeProperty("Itm_ID", pelta::Variant(Key()));
-    if (!CallBll(m_oForm.get(), m_oConnection.get(), "UpdNomItemsBomPrices", request.get()))
-        return;
+    if (!CallBll(m_oForm.get(), m_oConnection.get(), "UpdNomItemsBomPrices", request.get())) return;
     m_oForm->Refresh();
 }
 

@@ -102,19 +102,18 @@ constexpr EditorKind kPick = EditorKind::Selector;
 // row's key and the item's hidden.
 std::vector<cDetailFrame::GridDecl> ListGrids() {
     auto prices = [](bool Supplier) {
-        return std::vector<ColumnDecl>{
-            Edit("PriceList_ID", "Ценова листа", kCombo),
-            Edit("Cg_ID", Supplier ? "Доставчик" : "", kPick),
-            Edit("Measure_ID", "Мярка", kCombo),
-            Edit("BasePrice", "Цена", kNumber),
-            Edit("BasePriceWithVat", "Цена с ДДС", kNumber),
-            Edit("Currency_ID", "Валута", kCombo),
-            Edit("Rate", "Курс", kNumber),
-            Edit("IsVat", "ДДС вкл. в цената", kCheck),
-            Edit("Note", "Забележка", kText),
-            Shown("IsAutoGener", "Автоматична генерация"),
-            Hidden("ID"),
-            Hidden("Itm_ID")};
+        return std::vector<ColumnDecl>{Edit("PriceList_ID", "Ценова листа", kCombo),
+                                       Edit("Cg_ID", Supplier ? "Доставчик" : "", kPick),
+                                       Edit("Measure_ID", "Мярка", kCombo),
+                                       Edit("BasePrice", "Цена", kNumber),
+                                       Edit("BasePriceWithVat", "Цена с ДДС", kNumber),
+                                       Edit("Currency_ID", "Валута", kCombo),
+                                       Edit("Rate", "Курс", kNumber),
+                                       Edit("IsVat", "ДДС вкл. в цената", kCheck),
+                                       Edit("Note", "Забележка", kText),
+                                       Shown("IsAutoGener", "Автоматична генерация"),
+                                       Hidden("ID"),
+                                       Hidden("Itm_ID")};
     };
     return {
         {"gePriceList", 2110, prices(false)},
@@ -178,14 +177,14 @@ std::vector<cDetailFrame::GridDecl> ListGrids() {
         {"gePrefSuppl",
          2122,
          {Edit("SeqNo", "No.", kNumber), Edit("Cg_ID", "Доставчик", kPick),
-          Edit("MinQuantity", "Минимално кол.", kNumber),
-          Edit("StepQuantity", "Стъпка", kNumber), Edit("Measure_ID", "Мярка", kCombo),
-          Edit("Note", "Забележка", kText), Hidden("ID"), Hidden("Itm_ID")}},
+          Edit("MinQuantity", "Минимално кол.", kNumber), Edit("StepQuantity", "Стъпка", kNumber),
+          Edit("Measure_ID", "Мярка", kCombo), Edit("Note", "Забележка", kText), Hidden("ID"),
+          Hidden("Itm_ID")}},
         {"geVariantDef",
          2123,
          {Edit("SeqNo", "No.", kNumber), Edit("Dimension_ID", "Дименсия", kCombo),
-          Edit("DimensionView", "Изглед", kCombo), Edit("Note", "Забележка", kText),
-          Hidden("ID"), Hidden("Itm_ID")}},
+          Edit("DimensionView", "Изглед", kCombo), Edit("Note", "Забележка", kText), Hidden("ID"),
+          Hidden("Itm_ID")}},
         {"geMaterialBoms",
          2125,
          {Shown("BomItmName", "Съставен продукт"), Shown("BomName", "Рецепта"),
