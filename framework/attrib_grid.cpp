@@ -314,7 +314,8 @@ pelta::Recordset& AttribGridExtender::currentHead(const char* source) {
 
 pelta::Variant AttribGridExtender::Value(const std::string& Field) {
     Attribute& a = attribute(Field, "AttribGridExtender.Value");
-    if (!head_ || head_->bof() || head_->eof() || head_->status() == pelta::RowStatus::Deleted)
+    if (!head_ || head_->bof() || head_->eof() || head_->status() == pelta::RowStatus::Deleted ||
+        head_->fieldIndex(a.decl.Field) < 0)
         return {};
     return head_->value(a.decl.Field);
 }

@@ -55,7 +55,7 @@ public:
     void SetList(const std::string& Field, RecordsetRef Rows, const std::string& KeyField,
                  const std::string& ShownField, const std::string& ParentField = {}) override;
     void Bind(RecordsetRef Head) override;
-    // Empty when nothing is bound or the head has no current row.
+    // Empty when nothing is bound, the head has no current row or no such field.
     pelta::Variant Value(const std::string& Field) override;
     // What the person enters, by editor:
     // * entry: into a number field, a number or a text with "." or "," as

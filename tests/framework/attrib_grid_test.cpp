@@ -370,6 +370,12 @@ TEST_F(AttribGrid, EditStateFollowsThePersonsChanges) {
     head->update();
     EXPECT_EQ(value("Vat"), Variant(20.0));
 
+    // A field the head lacks has no value and takes none.
+    grid->AddAttribute(attrib(99, "Липсващо", "Missing"));
+    EXPECT_TRUE(grid->Value("Missing").isEmpty());
+    EXPECT_EQ(grid->ShownText("Missing"), "");
+    EXPECT_THROW(grid->UserSetValue("Missing", Variant("x")), pelta::Error);
+
     grid->Bind(nullptr);
     EXPECT_TRUE(grid->Value("Name2").isEmpty());
     EXPECT_THROW(grid->UserSetValue("Name2", Variant("x")), pelta::Error);
