@@ -14,6 +14,14 @@ using namespace PeltaNom15;
 
 // ---- TreeExtender -------------------------------------------------------------------
 
+TreeExtender::TreeExtender() {
+    services()->addTree(this);
+}
+
+TreeExtender::~TreeExtender() {
+    services()->removeTree(this);
+}
+
 void TreeExtender::Init(pelta::Object* Owner, const std::string& TreeName, int32_t HelpID) {
     setOwner(Owner);
     treeName_ = TreeName;

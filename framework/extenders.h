@@ -25,8 +25,15 @@ struct TreeNode {
     std::string text;
 };
 
+// Registers itself with the services while it lives, so that a host finds
+// the trees of a screen it did not make (treesOfOwner).
 class TreeExtender : public PeltaNom15::ITreeExtender, public ExtenderBase {
 public:
+    TreeExtender();
+    ~TreeExtender() override;
+    TreeExtender(const TreeExtender&) = delete;
+    TreeExtender& operator=(const TreeExtender&) = delete;
+
     PeltaNom15::TreeEvents& Events() override { return events_; }
     void Init(pelta::Object* Owner, const std::string& TreeName, int32_t HelpID) override;
     void Clear() override;

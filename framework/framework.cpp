@@ -1,5 +1,6 @@
 #include "framework/framework.h"
 
+#include "framework/attrib_grid.h"
 #include "framework/extenders.h"
 #include "framework/form_extender.h"
 #include "framework/grid_extender.h"
@@ -40,6 +41,7 @@ const ClassOf kClasses[] = {
     {kProgIdFieldExtender, make<FieldExtender>},
     {kProgIdFilterBandExtender, make<FilterBandExtender>},
     {kProgIdCacheDefExtender, make<CacheDefExtender>},
+    {kProgIdAttribGridExtender, make<AttribGridExtender>},
     // Sibling libraries of the suite.
     {kProgIdDmaDetails,
      [] { return pelta::ObjectRef(pelta::makeRef<SiblingForm>(kProgIdDmaDetails)); }},

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <system_error>
 
+#include "framework/attrib_grid.h"
 #include "framework/extenders.h"
 #include "framework/form_extender.h"
 #include "framework/grid_extender.h"
@@ -440,6 +441,60 @@ std::vector<QuickFilterExtender*> FrameworkServices::quickFiltersOfOwner(
     for (const auto& f : quickFilters_)
         if (f.second == self && f.first->owner() == owner) out.push_back(f.first);
     return out;
+}
+
+namespace {
+
+// The extenders of a register made on the calling thread for `owner`.
+template <class T>
+std::vector<T*> ofOwner(const std::vector<std::pair<T*, std::thread::id>>& all,
+                        const pelta::Object* owner) {
+    std::vector<T*> out;
+    if (!owner) return out;
+    const auto self = std::this_thread::get_id();
+    for (const auto& e : all)
+        if (e.second == self && e.first->owner() == owner) out.push_back(e.first);
+    return out;
+}
+
+template <class T>
+void unregister(std::vector<std::pair<T*, std::thread::id>>& all, T* extender) {
+    all.erase(
+        std::remove_if(all.begin(), all.end(), [&](const auto& e) { return e.first == extender; }),
+        all.end());
+}
+
+}  // namespace
+
+void FrameworkServices::addAttribGrid(AttribGridExtender* grid) {
+    std::lock_guard lock(mutex_);
+    attribGrids_.emplace_back(grid, std::this_thread::get_id());
+}
+
+void FrameworkServices::removeAttribGrid(AttribGridExtender* grid) {
+    std::lock_guard lock(mutex_);
+    unregister(attribGrids_, grid);
+}
+
+std::vector<AttribGridExtender*> FrameworkServices::attribGridsOfOwner(
+    const pelta::Object* owner) const {
+    std::lock_guard lock(mutex_);
+    return ofOwner(attribGrids_, owner);
+}
+
+void FrameworkServices::addTree(TreeExtender* tree) {
+    std::lock_guard lock(mutex_);
+    trees_.emplace_back(tree, std::this_thread::get_id());
+}
+
+void FrameworkServices::removeTree(TreeExtender* tree) {
+    std::lock_guard lock(mutex_);
+    unregister(trees_, tree);
+}
+
+std::vector<TreeExtender*> FrameworkServices::treesOfOwner(const pelta::Object* owner) const {
+    std::lock_guard lock(mutex_);
+    return ofOwner(trees_, owner);
 }
 
 void FrameworkServices::reset() {

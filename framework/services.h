@@ -19,9 +19,11 @@
 
 namespace pelta::fw {
 
+class AttribGridExtender;
 class FormExtender;
 class GridExtender;
 class QuickFilterExtender;
+class TreeExtender;
 class RecordDeletion;
 
 // Writes the host's log files: each Open appends to the named file.
@@ -193,6 +195,13 @@ public:
     void addQuickFilter(QuickFilterExtender* filter);
     void removeQuickFilter(QuickFilterExtender* filter);
     std::vector<QuickFilterExtender*> quickFiltersOfOwner(const pelta::Object* owner) const;
+    // Live attribute grids and trees, registered as grids are.
+    void addAttribGrid(AttribGridExtender* grid);
+    void removeAttribGrid(AttribGridExtender* grid);
+    std::vector<AttribGridExtender*> attribGridsOfOwner(const pelta::Object* owner) const;
+    void addTree(TreeExtender* tree);
+    void removeTree(TreeExtender* tree);
+    std::vector<TreeExtender*> treesOfOwner(const pelta::Object* owner) const;
 
     // Back to a fresh state: default host, no agent, empty settings in
     // memory, nothing refused, pointer 0. Live forms stay registered.
@@ -210,6 +219,8 @@ private:
     std::vector<std::pair<FormExtender*, std::thread::id>> forms_;
     std::vector<std::pair<GridExtender*, std::thread::id>> grids_;
     std::vector<std::pair<QuickFilterExtender*, std::thread::id>> quickFilters_;
+    std::vector<std::pair<AttribGridExtender*, std::thread::id>> attribGrids_;
+    std::vector<std::pair<TreeExtender*, std::thread::id>> trees_;
     int32_t mousePointer_ = 0;
 };
 

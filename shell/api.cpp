@@ -130,6 +130,47 @@ json describeColumns(const std::vector<ColumnInfo>& columns) {
     return out;
 }
 
+json describeAttributeGrids(const std::vector<AttribGridInfo>& attributeGrids) {
+    json out = json::array();
+    for (const AttribGridInfo& g : attributeGrids) {
+        json groups = json::array();
+        for (const AttribGroupInfo& grp : g.groups)
+            groups.push_back({{"number", grp.number}, {"caption", grp.caption}});
+        json rows = json::array();
+        for (const AttribRowInfo& r : g.rows) {
+            json options = json::array();
+            for (const AttribOption& o : r.options)
+                options.push_back({{"key", o.key}, {"text", o.text}, {"parent", o.parentKey}});
+            rows.push_back({{"group", r.group},
+                            {"field", r.field},
+                            {"caption", r.caption},
+                            {"editor", r.editor},
+                            {"value", toJson(r.value)},
+                            {"text", r.text},
+                            {"style", r.style},
+                            {"options", options},
+                            {"help", r.help}});
+        }
+        out.push_back({{"name", g.name},
+                       {"groups", groups},
+                       {"rows", rows},
+                       {"selected", g.selected},
+                       {"help", g.help}});
+    }
+    return out;
+}
+
+json describeTrees(const std::vector<TreeInfo>& trees) {
+    json out = json::array();
+    for (const TreeInfo& t : trees) {
+        json nodes = json::array();
+        for (const TreeNodeInfo& n : t.nodes)
+            nodes.push_back({{"parent", n.parentKey}, {"key", n.key}, {"text", n.text}});
+        out.push_back({{"name", t.name}, {"nodes", nodes}, {"selected", t.selected}});
+    }
+    return out;
+}
+
 json describeScreen(int64_t id, Screen& s) {
     json commands = json::array();
     for (const CommandInfo& c : s.commands()) {
@@ -174,7 +215,9 @@ json describeScreen(int64_t id, Screen& s) {
             {"caption", s.caption()},
             {"commands", commands},
             {"controls", controls},
-            {"grids", grids}};
+            {"grids", grids},
+            {"attributeGrids", describeAttributeGrids(s.attributeGrids())},
+            {"trees", describeTrees(s.trees())}};
 }
 
 // "Code:asc,Name:desc" against the grid's columns.
@@ -486,6 +529,79 @@ ApiResponse Api::route(const ApiRequest& r) {
                 throw ApiError(400, "Unknown filter field");
             screen->setFilter(grid.name, field, text);
             return json{{"ok", true}, {"total", screen->rows(grid.name, 0, 1, {}).total}};
+        }));
+    }
+    // The attribute grid named in the body (the first when none is named)
+    // and its row `field`.
+    auto findAttribute = [&](Screen& screen, const std::string& gridName,
+                             const std::string& field) {
+        std::vector<AttribGridInfo> grids = screen.attributeGrids();
+        auto grid = std::find_if(grids.begin(), grids.end(), [&](const AttribGridInfo& g) {
+            return gridName.empty() || g.name == gridName;
+        });
+        if (grid == grids.end()) throw ApiError(400, "Unknown attribute grid");
+        auto row = std::find_if(grid->rows.begin(), grid->rows.end(),
+                                [&](const AttribRowInfo& r) { return r.field == field; });
+        if (row == grid->rows.end()) throw ApiError(400, "Unknown attribute");
+        return std::pair<std::string, AttribRowInfo>(grid->name, *row);
+    };
+    if (action == "attributes") {
+        std::string gridName = stringField(body, "grid", false);
+        std::string field = stringField(body, "field", true);
+        if (!body.contains("value")) throw ApiError(400, "Missing field \"value\"");
+        const json& value = body["value"];
+        if (!value.is_primitive()) throw ApiError(400, "Field \"value\" must be a plain value");
+        if (value.is_string() && value.get_ref<const std::string&>().size() > 100000)
+            throw ApiError(400, "The value is too long");
+        return ok(s.ui().call([&] {
+            auto screen = needScreen();
+            auto [grid, row] = findAttribute(*screen, gridName, field);
+            if (row.editor == "selector")
+                throw ApiError(400, "The attribute is chosen through its button");
+            Variant typed;
+            if (row.editor == "check") {
+                try {
+                    typed = fromJson(value, "check");
+                } catch (const pelta::Error& e) {
+                    throw ApiError(400, e.description());
+                }
+            } else {
+                // Numbers stay as typed ("1,5"): the grid reads them.
+                if (value.is_boolean()) throw ApiError(400, "Field \"value\" must be text");
+                typed = fromJson(value, "text");
+            }
+            return json{{"ok", screen->setAttribute(grid, field, typed)}};
+        }));
+    }
+    if (action == "attributebutton" || action == "attributeselect") {
+        std::string gridName = stringField(body, "grid", false);
+        std::string field = stringField(body, "field", true);
+        return ok(s.ui().call([&] {
+            auto screen = needScreen();
+            auto [grid, row] = findAttribute(*screen, gridName, field);
+            if (action == "attributeselect") {
+                screen->selectAttribute(grid, field);
+                return json{{"ok", true}};
+            }
+            if (row.editor != "selector") throw ApiError(400, "The attribute has no button");
+            screen->attributeButton(grid, field);
+            return json{{"ok", true}};
+        }));
+    }
+    if (action == "activate") {
+        std::string treeName = stringField(body, "tree", false);
+        std::string key = stringField(body, "key", true);
+        return ok(s.ui().call([&] {
+            auto screen = needScreen();
+            std::vector<TreeInfo> trees = screen->trees();
+            auto tree = std::find_if(trees.begin(), trees.end(), [&](const TreeInfo& t) {
+                return treeName.empty() || t.name == treeName;
+            });
+            if (tree == trees.end()) throw ApiError(400, "Unknown tree");
+            if (std::none_of(tree->nodes.begin(), tree->nodes.end(),
+                             [&](const TreeNodeInfo& n) { return n.key == key; }))
+                throw ApiError(400, "Unknown node");
+            return json{{"ok", screen->activateNode(tree->name, key)}};
         }));
     }
     if (action == "execute") {

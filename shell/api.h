@@ -15,6 +15,10 @@
 //   POST   /api/screens/N/addrow {grid}           a new row in an editable grid
 //   POST   /api/screens/N/cells  {grid, row, column, value}  a cell typed
 //   POST   /api/screens/N/group  {grid, value}    the group a grouped grid shows
+//   POST   /api/screens/N/attributes {grid?, field, value}  an attribute entered
+//   POST   /api/screens/N/attributebutton {grid?, field}  a selector row's button
+//   POST   /api/screens/N/attributeselect {grid?, field}  the chosen attribute row
+//   POST   /api/screens/N/activate {tree?, key}   a tree node clicked
 //   DELETE /api/screens/N      ?force=1        closes the screen
 //   POST   /api/dialog/N       {button, value?} answers a waiting dialog
 //

@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "bll/service.h"
+#include "framework/attrib_grid.h"
 #include "framework/extenders.h"
 #include "framework/form_extender.h"
 #include "framework/framework.h"
@@ -139,6 +140,39 @@ std::vector<std::pair<std::string, std::string>> optionsOf(const RecordsetRef& r
         out.emplace_back(key, shownText.empty() ? key : shownText);
     }
     return out;
+}
+
+// How the page edits an attribute: an entry by its head field's type.
+std::string attribEditor(fw::AttribGridExtender& grid, const PeltaNom15::AttribDecl& a) {
+    using PeltaNom15::AttribEditor;
+    switch (a.Editor) {
+        case AttribEditor::CheckBox:
+            return "check";
+        case AttribEditor::List:
+            return "list";
+        case AttribEditor::FixedList:
+            return "fixedlist";
+        case AttribEditor::Selector:
+            return "selector";
+        case AttribEditor::TreeList:
+            return "treelist";
+        case AttribEditor::Entry:
+            break;
+    }
+    RecordsetRef head = grid.head();
+    int index = head ? head->fieldIndex(a.Field) : -1;
+    if (index < 0) return a.Format.empty() ? "text" : "number";
+    switch (head->fieldDef(static_cast<size_t>(index)).type) {
+        case pelta::FieldType::Long:
+        case pelta::FieldType::Double:
+        case pelta::FieldType::Currency:
+        case pelta::FieldType::Decimal:
+            return "number";
+        case pelta::FieldType::Date:
+            return "date";
+        default:
+            return "text";
+    }
 }
 
 // A quick-filter field whose caption is a key ("cg-grp") is set by the
@@ -461,6 +495,83 @@ public:
         return ok;
     }
 
+    std::vector<AttribGridInfo> attributeGrids() override {
+        std::vector<AttribGridInfo> out;
+        for (fw::AttribGridExtender* a : attribGridExtenders()) {
+            AttribGridInfo info;
+            info.name = a->GridName();
+            for (const auto& g : a->groups())
+                info.groups.push_back(AttribGroupInfo{g.number, g.caption});
+            for (const PeltaNom15::AttribDecl& d : a->Attributes()) {
+                AttribRowInfo row;
+                row.group = d.Group;
+                row.field = d.Field;
+                row.caption = d.Caption;
+                row.editor = attribEditor(*a, d);
+                row.value = a->Value(d.Field);
+                fw::AttribGridExtender::ShownRow shown = a->shownRow(d.Field);
+                row.text = std::move(shown.text);
+                row.style = std::move(shown.style);
+                if (d.Editor == PeltaNom15::AttribEditor::List ||
+                    d.Editor == PeltaNom15::AttribEditor::FixedList ||
+                    d.Editor == PeltaNom15::AttribEditor::TreeList)
+                    for (auto& c : a->choices(d.Field))
+                        row.options.push_back(AttribOption{c.key, c.text, c.parentKey});
+                row.help = d.Help;
+                info.rows.push_back(std::move(row));
+            }
+            info.selected = a->SelectedField();
+            info.help = a->HelpText();
+            out.push_back(std::move(info));
+        }
+        return out;
+    }
+
+    std::vector<TreeInfo> trees() override {
+        std::vector<TreeInfo> out;
+        if (!owner_) return out;
+        for (fw::TreeExtender* t : fw::services()->treesOfOwner(owner_.get())) {
+            TreeInfo info;
+            info.name = t->treeName();
+            for (const fw::TreeNode& n : t->nodes())
+                info.nodes.push_back(TreeNodeInfo{n.parentKey, n.key, n.text});
+            info.selected = t->SelectedKey();
+            out.push_back(std::move(info));
+        }
+        return out;
+    }
+
+    bool setAttribute(const std::string& grid, const std::string& field,
+                      const Variant& value) override {
+        pelta::Ref<fw::AttribGridExtender> a(&attribGridNamed(grid));
+        bool ok = a->UserSetValue(field, value);
+        invalidate();
+        return ok;
+    }
+
+    void attributeButton(const std::string& grid, const std::string& field) override {
+        pelta::Ref<fw::AttribGridExtender> a(&attribGridNamed(grid));
+        a->buttonClick(field);
+        invalidate();
+    }
+
+    void selectAttribute(const std::string& grid, const std::string& field) override {
+        pelta::Ref<fw::AttribGridExtender> a(&attribGridNamed(grid));
+        a->Select(field);
+    }
+
+    bool activateNode(const std::string& tree, const std::string& key) override {
+        if (!owner_) refuse("The form is closed");
+        for (fw::TreeExtender* t : fw::services()->treesOfOwner(owner_.get())) {
+            if (!equalsNoCaseAscii(t->treeName(), tree)) continue;
+            pelta::Ref<fw::TreeExtender> keep(t);  // the node's screen code may drop it
+            bool ok = keep->SelectNode(key);
+            invalidate();
+            return ok;
+        }
+        refuse("No tree " + tree);
+    }
+
     bool queryTerminate() override;
     void terminate() override { release(); }
 
@@ -475,6 +586,17 @@ protected:
     bool editableGrids() const override { return true; }
 
 private:
+    std::vector<fw::AttribGridExtender*> attribGridExtenders() const {
+        if (!owner_) return {};
+        return fw::services()->attribGridsOfOwner(owner_.get());
+    }
+
+    fw::AttribGridExtender& attribGridNamed(const std::string& name) {
+        for (fw::AttribGridExtender* a : attribGridExtenders())
+            if (name.empty() || equalsNoCaseAscii(a->GridName(), name)) return *a;
+        refuse("No attribute grid " + name);
+    }
+
     bool savedNothing_ = false;
 };
 

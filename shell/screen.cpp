@@ -30,4 +30,26 @@ void Screen::setFilter(const std::string& grid, int32_t, const std::string&) {
                  "pelta.shell");
 }
 
+namespace {
+[[noreturn]] void noAttributes(const std::string& grid) {
+    pelta::raise(pelta::errc::InvalidProcedureCall, "No attribute grid " + grid, "pelta.shell");
+}
+}  // namespace
+
+bool Screen::setAttribute(const std::string& grid, const std::string&, const Variant&) {
+    noAttributes(grid);
+}
+
+void Screen::attributeButton(const std::string& grid, const std::string&) {
+    noAttributes(grid);
+}
+
+void Screen::selectAttribute(const std::string& grid, const std::string&) {
+    noAttributes(grid);
+}
+
+bool Screen::activateNode(const std::string& tree, const std::string&) {
+    pelta::raise(pelta::errc::InvalidProcedureCall, "No tree " + tree, "pelta.shell");
+}
+
 }  // namespace pelta::shell

@@ -76,6 +76,59 @@ struct ControlInfo {
     std::string prompt;  // shown in an empty field
 };
 
+// An attribute grid of a detail form: further fields of the record, one row
+// each ("Име", "Стойност"), in numbered groups, with the chosen row's help
+// text under the grid.
+struct AttribOption {
+    std::string key;
+    std::string text;
+    std::string parentKey;  // tree lists: the parent's key, empty at the root
+};
+
+struct AttribRowInfo {
+    int32_t group = 0;
+    std::string field;
+    std::string caption;
+    // "text", "number", "date", "check", "list", "fixedlist", "treelist", "selector"
+    std::string editor;
+    Variant value;
+    // The value as the row shows it: a list's or fixed list's text, a
+    // selector's name, a number in its format. Empty for a check box, which
+    // the page draws from the value.
+    std::string text;
+    std::string style;                  // "Inactive", "Required" ... empty when plain
+    std::vector<AttribOption> options;  // lists, tree lists and fixed lists
+    std::string help;                   // may hold "[b]...[/b]"
+};
+
+struct AttribGroupInfo {
+    int32_t number = 0;
+    std::string caption;
+};
+
+struct AttribGridInfo {
+    std::string name;
+    std::vector<AttribGroupInfo> groups;  // in their order
+    std::vector<AttribRowInfo> rows;      // in the order declared
+    std::string selected;                 // the chosen row's field; empty when none
+    std::string help;                     // the chosen row's help text
+};
+
+// A tree of a detail form. A declared control whose group is the key of one
+// of its nodes belongs to that node: the page shows it while the node is the
+// selected one.
+struct TreeNodeInfo {
+    std::string parentKey;  // empty at the root
+    std::string key;
+    std::string text;
+};
+
+struct TreeInfo {
+    std::string name;
+    std::vector<TreeNodeInfo> nodes;  // parents before their children
+    std::string selected;             // empty when none is selected
+};
+
 struct SortKey {
     std::string column;
     bool descending = false;
@@ -139,6 +192,22 @@ public:
     // Quick filters: the text of field `field` of `grid`'s quick filter,
     // applied to the rows at once.
     virtual void setFilter(const std::string& grid, int32_t field, const std::string& text);
+
+    // Attribute grids and trees of a detail form; none by default.
+    virtual std::vector<AttribGridInfo> attributeGrids() { return {}; }
+    virtual std::vector<TreeInfo> trees() { return {}; }
+    // A value the person entered in the attribute grid `grid`: converted,
+    // checked and written by the grid; false when refused (not a number, not
+    // offered, or the screen said no). The defaults raise: a screen without
+    // attribute grids or trees.
+    virtual bool setAttribute(const std::string& grid, const std::string& field,
+                              const Variant& value);
+    // The button of a selector row: the screen picks the record.
+    virtual void attributeButton(const std::string& grid, const std::string& field);
+    // The person chose a row; its help text shows under the grid.
+    virtual void selectAttribute(const std::string& grid, const std::string& field);
+    // The person clicked a node of a tree; false when the tree has no such node.
+    virtual bool activateNode(const std::string& tree, const std::string& key);
 
     // The termination protocol: may refuse (unsaved edits the person keeps).
     virtual bool queryTerminate() = 0;

@@ -4,13 +4,14 @@
 import './style.css';
 import { ApiError, Connection } from './api.js';
 import { Dialogs } from './dialogs.js';
-import { renderForm } from './form.js';
+import { AttributeGrid, hiddenByTree, renderForm, renderTree, updateForm } from './form.js';
 import { ListGrid } from './grid.js';
 import { RowsTable } from './rows.js';
 
 const connection = new Connection();
 const dialogs = new Dialogs(document.getElementById('dialog'), connection);
-const screens = new Map(); // id -> { description, tab, view, grids: [ListGrid] }
+// id -> { description, tab, view, grids: [ListGrid], form, attributes: [AttributeGrid] }
+const screens = new Map();
 let active = null;
 const writes = new Set(); // changes on their way to the server
 
@@ -143,11 +144,82 @@ function toolbar(screen) {
   return bar;
 }
 
+// ---- a detail form's attribute grids and trees ----------------------------------------
+
+// The form's values, attribute grids included, as the server holds them now:
+// the screen's events may have changed more than the value sent.
+async function refreshForm(screen, force = '') {
+  const id = screen.description.id;
+  let d;
+  try {
+    d = await connection.get(`/api/screens/${id}`);
+  } catch (e) {
+    if (e.status !== 404) reportError(e);
+    return;
+  }
+  const names = (list) => JSON.stringify((list ?? []).map((x) => x.name));
+  if (names(d.attributeGrids) !== names(screen.description.attributeGrids)) {
+    await showScreen(id, false);
+    return;
+  }
+  screen.description = d;
+  if (screen.form) updateForm(screen.form, d);
+  for (const a of screen.attributes) {
+    const info = d.attributeGrids.find((x) => x.name === a.name);
+    if (info) a.update(info, force);
+  }
+}
+
+// Draws the screen anew, then puts the focus back where the person was.
+async function redraw(screen, focusSelector) {
+  await showScreen(screen.description.id, false);
+  screen.view.querySelector(focusSelector)?.focus();
+}
+
+const REFUSED = 'Стойността не е приета';
+
+function attributeActions(screen, grid) {
+  const base = `/api/screens/${screen.description.id}`;
+  return {
+    set: (field, value) =>
+      track(
+        connection
+          .post(`${base}/attributes`, { grid, field, value })
+          .then((reply) => {
+            if (!reply.ok) status(REFUSED);
+            else if ($('status').textContent === REFUSED) status('');
+            return refreshForm(screen, reply.ok ? '' : field);
+          })
+          .catch(reportError),
+      ),
+    button: (field) =>
+      track(
+        connection
+          .post(`${base}/attributebutton`, { grid, field })
+          .then(() => redraw(screen, `[data-attributes="${CSS.escape(grid)}"] [name="${CSS.escape(field)}"]`))
+          .catch(reportError),
+      ),
+    select: (field) =>
+      track(connection.post(`${base}/attributeselect`, { grid, field }).catch(reportError)),
+  };
+}
+
+function activateNode(screen, tree, key) {
+  return track(
+    connection
+      .post(`/api/screens/${screen.description.id}/activate`, { tree, key })
+      .then(() => redraw(screen, `[data-tree="${CSS.escape(tree)}"] [data-node="${CSS.escape(key)}"]`))
+      .catch(reportError),
+  );
+}
+
 function render(screen) {
   const d = screen.description;
   screen.tab.querySelector('.tab-caption').textContent = d.caption;
   for (const g of screen.grids) g.destroy();
   screen.grids = [];
+  screen.attributes = [];
+  screen.form = null;
   screen.view.replaceChildren(toolbar(screen));
   screen.view.dataset.kind = d.kind;
   if (d.kind === 'detail') {
@@ -162,25 +234,48 @@ function render(screen) {
       ),
     );
     screen.view.append(form);
+    screen.form = form;
+    for (const info of d.attributeGrids ?? []) {
+      const grid = new AttributeGrid(info, attributeActions(screen, info.name));
+      screen.attributes.push(grid);
+      screen.view.append(grid.element);
+    }
   }
+  // A form with a tree shows it on the left of its lists; a list belongs to
+  // the node whose key is its control's group and shows while that node is selected.
+  let lists = screen.view;
+  const trees = d.kind === 'detail' ? d.trees ?? [] : [];
+  if (trees.length) {
+    const area = document.createElement('div');
+    area.className = 'lists-area';
+    const side = document.createElement('div');
+    side.className = 'lists-trees';
+    for (const t of trees) side.append(renderTree(t, (key) => activateNode(screen, t.name, key)));
+    lists = document.createElement('div');
+    lists.className = 'lists';
+    area.append(side, lists);
+    screen.view.append(area);
+  }
+  const hidden = hiddenByTree(d);
   for (const g of d.grids) {
-    if (g.groups && g.groups.length > 1) screen.view.append(groupFilter(screen, g));
-    if (g.filters && g.filters.length) screen.view.append(quickFilter(screen, g));
     // A form's grid under the caption of the control it stands for.
     const declared = d.kind === 'detail' && d.controls.find((c) => c.kind === 'grid' && c.name === g.name);
+    if (declared && hidden(declared.group)) continue;
+    if (g.groups && g.groups.length > 1) lists.append(groupFilter(screen, g));
+    if (g.filters && g.filters.length) lists.append(quickFilter(screen, g));
     if (declared && declared.caption) {
       const heading = document.createElement('h3');
       heading.className = 'grid-caption';
       heading.textContent = declared.caption;
-      screen.view.append(heading);
+      lists.append(heading);
     }
     const holder = document.createElement('div');
     holder.className = 'grid';
     holder.dataset.grid = g.name;
-    screen.view.append(holder);
+    lists.append(holder);
     const footer = document.createElement('div');
     footer.className = 'footer';
-    screen.view.append(footer);
+    lists.append(footer);
     const callbacks = {
       onOpen: () => {
         const open = d.commands.find((c) => c.id === 102 && c.enabled);
@@ -314,7 +409,7 @@ async function drawScreen(id, bringForward) {
     view.className = 'screen';
     view.dataset.screen = String(id);
     $('screens').append(view);
-    screen = { description, tab, view, grids: [] };
+    screen = { description, tab, view, grids: [], attributes: [], form: null };
     screens.set(id, screen);
   }
   const isNew = !screen.drawn;
