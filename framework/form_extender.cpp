@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "framework/attrib_grid.h"
 #include "framework/extenders.h"
 #include "framework/services.h"
 #include "library/contracts/Constants.h"
@@ -309,7 +310,13 @@ int32_t FormExtender::MsgBox(const std::string& Text, int32_t Style, const std::
 
 void FormExtender::ShowMessage(const std::string& ControlName, const std::string& Text,
                                const std::string& Title, const std::string& Hint) {
-    if (!ControlName.empty()) controlIndex(ControlName);
+    // A message may point at a declared control or at one of the form's
+    // attribute grids (which has chosen the row concerned).
+    bool attributes = false;
+    if (!ControlName.empty())
+        for (auto* a : services()->attribGridsOfOwner(owner()))
+            attributes = attributes || a->GridName() == ControlName;
+    if (!ControlName.empty() && !attributes) controlIndex(ControlName);
     Prompt p;
     p.kind = PromptKind::Anchored;
     p.text = Text;
@@ -318,7 +325,8 @@ void FormExtender::ShowMessage(const std::string& ControlName, const std::string
     p.title = Title;
     p.hint = Hint;
     requireAgent(Text)->anchoredMessage(p);
-    if (!ControlName.empty()) focus_ = controls_[controlIndex(ControlName)].Name;
+    if (!ControlName.empty())
+        focus_ = attributes ? ControlName : controls_[controlIndex(ControlName)].Name;
 }
 
 int32_t FormExtender::AskYesNo(const std::string& Text, const std::string& Caption) {

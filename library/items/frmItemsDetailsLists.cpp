@@ -477,8 +477,9 @@ void frmItemsDetails::pvPickAttribute(const std::string& Field) {
     if (!kind || !centres || centres->recordCount() == 0) return;
     auto c = centres->clone();
     const std::string quoted = SqlQuote(text);
-    c->setFilter("Type = " + std::to_string(kind->Type) + " AND (Code = '" + quoted +
-                 "' OR Name = '" + quoted + "')");
+    const std::string type = "Type = " + std::to_string(kind->Type);
+    c->setFilter("(" + type + " AND Code = '" + quoted + "') OR (" + type + " AND Name = '" +
+                 quoted + "')");
     if (c->recordCount() == 0) {
         m_oForm->MsgBox(Printf("Не е намерен център на себестойност '%1'.", text), vbExclamation,
                         caption);

@@ -49,8 +49,7 @@ TEST_F(ItemListsTest, EveryListHasItsNodeAndItsGridIsFilledWhenTheNodeIsShown) {
     ASSERT_NE(t, nullptr);
     EXPECT_EQ(children(d, ""),
               (std::vector<std::string>{"Списъци", "Производство и придобиване", "Контрол",
-                                        "Търговска система", "Счетоводна система",
-                                        "Организация"}));
+                                        "Търговска система", "Счетоводна система", "Организация"}));
     const auto lists = children(d, "Списъци");
     ASSERT_EQ(lists.size(), 16u);
     EXPECT_EQ(lists[1], "Фасети на мерки");
@@ -193,9 +192,10 @@ TEST_F(ItemListsTest, DocumentNodesOpenTheOtherLibrariesListsFilteredByTheItem) 
 }
 
 TEST_F(ItemListsTest, ACostCentreIsChosenByItsCodeAndClearedByNothing) {
-    exec("INSERT INTO nom_costcenters (ID, Type, Code, Name, IsActive) VALUES "
-         "('{6F1C2D3E-0000-4000-8000-000000000001}', 1, 'П-7', 'Обект Изток', 1), "
-         "('{6F1C2D3E-0000-4000-8000-000000000002}', 0, 'П-7', 'Отдел Изток', 1)");
+    exec(
+        "INSERT INTO nom_costcenters (ID, Type, Code, Name, IsActive) VALUES "
+        "('{6F1C2D3E-0000-4000-8000-000000000001}', 1, 'П-7', 'Обект Изток', 1), "
+        "('{6F1C2D3E-0000-4000-8000-000000000002}', 0, 'П-7', 'Отдел Изток', 1)");
     items->FormExtender()->Execute(kCmdRefresh);
     auto* d = openItem(firstCode());
     ASSERT_NE(d, nullptr);
