@@ -363,6 +363,14 @@ WritePlan planWrite(Database& db, Recordset& rs, const TableWrite& spec) {
     return p;
 }
 
+// The placeholder of a value for `c`: an empty value of a NOT NULL column
+// with a declared default takes the default (schema text, never a request's).
+std::string placeholder(const TableColumn& c, int index) {
+    const std::string mark = "?" + std::to_string(index);
+    if (!c.notNull || c.defaultValue.empty()) return mark;
+    return "COALESCE(" + mark + ", " + c.defaultValue + ")";
+}
+
 // The scope condition with its placeholder numbered `index`; empty without a
 // scope.
 std::string scopeCondition(const TableWrite& spec, int index) {
@@ -455,20 +463,20 @@ WriteResult writeRows(OperationContext& ctx, Recordset& rs, const TableWrite& sp
     if (spec.updates) {
         std::string sql = "UPDATE " + ctx.db.quote(spec.table) + " SET ";
         int n = 0;
-        auto set = [&](const std::string& col) {
+        auto set = [&](const TableColumn* c, const std::string& col) {
             if (n) sql += ", ";
             ++n;
-            sql += ctx.db.quote(col) + " = ?" + std::to_string(n);
+            sql += ctx.db.quote(col) + " = " + (c ? placeholder(*c, n) : "?" + std::to_string(n));
         };
         for (auto& m : p.mapped)
-            set(m.second->name);
+            set(m.second, m.second->name);
         for (auto& fx : p.fixed)
-            set(fx.first->name);
+            set(fx.first, fx.first->name);
         for (const TableColumn* c : p.derived)
-            set(c->name);
+            set(c, c->name);
         if (p.audit) {
-            set("LU");
-            set("LD");
+            set(nullptr, "LU");
+            set(nullptr, "LD");
         }
         sql += " WHERE " + ctx.db.quote(p.key->name) + " = ?" + std::to_string(n + 1);
         const bool checkLd = spec.checkLastChange && p.ld && p.ldField >= 0;
@@ -517,27 +525,25 @@ WriteResult writeRows(OperationContext& ctx, Recordset& rs, const TableWrite& sp
     if (spec.inserts) {
         std::string cols, marks;
         int n = 0;
-        auto add = [&](const std::string& col) {
+        auto add = [&](const TableColumn* c, const std::string& col) {
             if (n) {
                 cols += ", ";
                 marks += ", ";
             }
             ++n;
             cols += ctx.db.quote(col);
-            marks += "?" + std::to_string(n);
+            marks += c ? placeholder(*c, n) : "?" + std::to_string(n);
         };
-        add(p.key->name);
+        add(nullptr, p.key->name);
         for (auto& m : p.mapped)
-            add(m.second->name);
+            add(m.second, m.second->name);
         for (auto& fx : p.fixed)
-            add(fx.first->name);
+            add(fx.first, fx.first->name);
         for (const TableColumn* c : p.derived)
-            add(c->name);
+            add(c, c->name);
         if (p.audit) {
-            add("CU");
-            add("CD");
-            add("LU");
-            add("LD");
+            for (const char* col : {"CU", "CD", "LU", "LD"})
+                add(nullptr, col);
         }
         std::string sql =
             "INSERT INTO " + ctx.db.quote(spec.table) + " (" + cols + ") VALUES (" + marks + ")";

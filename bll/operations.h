@@ -178,7 +178,9 @@ struct WriteResult {
 
 // Writes the pending rows of `rs` by their status: deleted rows first, then
 // modified, then new (new rows with an empty key get a new key). Columns of
-// the recordset that the table lacks are ignored. Violations raise Refusal.
+// the recordset that the table lacks are ignored; an empty value of a NOT
+// NULL column with a declared default takes the default. Violations raise
+// Refusal.
 WriteResult writeRows(OperationContext& ctx, Recordset& rs, const TableWrite& spec);
 // Stamps LU, LD of an unchanged head whose rows changed, with the same check
 // of the last change. Raises Refusal 18 when the head changed meanwhile.
