@@ -124,6 +124,8 @@ struct TableColumn {
     ColumnType type;
     bool notNull = false;
     bool primaryKey = false;
+    // The declared default as SQL text (a literal); empty when none.
+    std::string defaultValue;
 };
 
 // A foreign key: `table`.`column` refers to `refTable`.`refColumn`.

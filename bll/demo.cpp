@@ -194,6 +194,7 @@ void generateDemo(Database& db, const DemoOptions& o) {
     put("DefCgDimensionName", "Дименсии на контрагенти");
     generatePartnersDemo(db, o);
     generateDemoItems(db, DemoItemsContext{currencyIds}, std::clamp(o.items, 0, 1000000), o.seed);
+    generateDemoItemDetails(db, o.seed, o.generatedPrices);
     tx.commit();
 }
 

@@ -1,16 +1,21 @@
 // The demo catalogue: items with measures, barcodes (every hundredth item is
 // sold by weight and carries a weight-barcode template), supplier codes,
 // prices of the retail type in two currencies and two measures, stock in the
-// central store, and discounts. Deterministic from the seed; written with
+// central store, and discounts; then what the item's detail form shows
+// beside them: reference lists, a generated price list, lots and bills of
+// materials of the last items. Deterministic from the seed; written with
 // prepared statements inside the caller's transaction, so that a million
 // items take seconds, not hours.
 #include <array>
 #include <cstdio>
+#include <map>
 #include <random>
+#include <tuple>
 
 #include "bll/database.h"
 #include "bll/demo_items.h"
 #include "bll/items.h"
+#include "bll/pricing.h"
 #include "platform/automation/guid.h"
 
 namespace pelta::bll {
@@ -204,9 +209,11 @@ void generateDemoItems(Database& db, const DemoItemsContext& c, int count, uint6
         "?9, 1, 1, ?10, 2, ?11, ?12, 0, ?13, ?14, ?15, ?16, ?17, ?18, ?19, ?20, ?21, ?22, ?21, "
         "?22)");
     auto ratio = db.prepare(
-        "INSERT INTO nom_itemsmeasures (ID, Itm_ID, Measure_ID, Ratio) VALUES (?1, ?2, ?3, ?4)");
+        "INSERT INTO nom_itemsmeasures (ID, Itm_ID, Measure_ID, Ratio, RatioPerUnits, RatioCoeff) "
+        "VALUES (?1, ?2, ?3, ?4, 1000000, ?4)");
     auto barcode = db.prepare(
-        "INSERT INTO nom_itemsbarcodes (ID, Itm_ID, BarCode, Measure_ID) VALUES (?1, ?2, ?3, ?4)");
+        "INSERT INTO nom_itemsbarcodes (ID, Itm_ID, BarCode, Measure_ID, Type) "
+        "VALUES (?1, ?2, ?3, ?4, ?5)");
     auto suppl = db.prepare(
         "INSERT INTO nom_itemssupplcodes (ID, Itm_ID, Cg_ID, Code, Measure_ID) "
         "VALUES (?1, ?2, NULL, ?3, ?4)");
@@ -314,6 +321,7 @@ void generateDemoItems(Database& db, const DemoItemsContext& c, int count, uint6
             barcode->bindText(2, id);
             barcode->bindText(3, codes[b]);
             barcode->bindText(4, measures[b]);
+            barcode->bindInt64(5, byWeight ? -1 : 1);  // a weight template, else EAN-13
             barcode->step();
         }
         if (hasSuppl) {
@@ -364,6 +372,254 @@ void generateDemoItems(Database& db, const DemoItemsContext& c, int count, uint6
     set->bindText(1, "DefPriceList_ID");
     set->bindText(2, plTypes[0]);
     set->step();
+}
+
+}  // namespace pelta::bll
+
+namespace pelta::bll {
+
+namespace {
+
+std::string scalarText(Database& db, const std::string& sql) {
+    auto st = db.prepare(sql);
+    if (!st->step() || st->isNull(0)) return {};
+    return std::string(st->text(0));
+}
+
+}  // namespace
+
+void generateDemoItemDetails(Database& db, uint64_t seed, bool priceTypes) {
+    Keys keys(seed ^ 0xDE7A115ULL);
+    const ColumnType guid = ColumnType::parse("GUID").value();
+    const ColumnType price = ColumnType::parse("DECIMAL(18,8)").value();
+    const ColumnType qty = ColumnType::parse("DECIMAL(18,6)").value();
+    const ColumnType pct = ColumnType::parse("DECIMAL(9,4)").value();
+    const ColumnType day = ColumnType::parse("DATE").value();
+    const Variant admin(kAdminId);
+    const Date stamp = makeDate(2024, 1, 1, 9, 0, 0);
+    auto exec = [&](const std::string& sql, std::initializer_list<Variant> params) {
+        auto st = db.prepare(sql);
+        int i = 0;
+        for (const Variant& p : params)
+            st->bind(++i, p);
+        st->step();
+    };
+
+    // Duty tariffs, Intrastat codes (one the default) and shelves.
+    std::vector<std::string> tariffs;
+    for (const auto& [code, name, percent] :
+         {std::tuple{"0901", "Кафе, печено или непечено", 75},
+          std::tuple{"2202", "Води и безалкохолни напитки", 96},
+          std::tuple{"8544", "Изолирани проводници и кабели", 37}}) {
+        tariffs.push_back(keys.next());
+        auto st = db.prepare(
+            "INSERT INTO nom_dutytariffs (ID, Code, Name, DutyTariffPrc, IsActive, CU, CD, LU, "
+            "LD) VALUES (?1, ?2, ?3, ?4, 1, ?5, ?6, ?5, ?6)");
+        st->bindText(1, tariffs.back());
+        st->bindText(2, code);
+        st->bindText(3, name);
+        st->bind(4, Variant(Decimal(percent) / Decimal(10)), pct);
+        st->bind(5, admin, guid);
+        st->bind(6, Variant(stamp));
+        st->step();
+    }
+    std::string defaultIntrastat;
+    for (const auto& [code, name, isDefault] :
+         {std::tuple{"09012100", "Кафе, печено, с кофеин", 1},
+          std::tuple{"22021000", "Води, вкл. минерални и газирани, подсладени", 0},
+          std::tuple{"85444993", "Проводници за напрежение не повече от 80 V", 0}}) {
+        const std::string id = keys.next();
+        if (isDefault) defaultIntrastat = id;
+        exec(
+            "INSERT INTO nom_intrastat (ID, Code, Name, IsDefault, IsActive) VALUES (?1, ?2, ?3, "
+            "?4, 1)",
+            {Variant(id), Variant(code), Variant(name), Variant(isDefault)});
+    }
+    const std::string central = scalarText(db, "SELECT ID FROM nom_stores WHERE Code = '1'");
+    for (const auto& [code, name] :
+         {std::pair{"A-01", "Стелаж A, ниво 1"}, std::pair{"A-02", "Стелаж A, ниво 2"},
+          std::pair{"B-01", "Стелаж B, ниво 1"}})
+        exec(
+            "INSERT INTO nom_shelves (ID, Code, Name, Store_ID, IsActive) VALUES (?1, ?2, ?3, ?4, "
+            "1)",
+            {Variant(keys.next()), Variant(code), Variant(name),
+             central.empty() ? Variant::null() : Variant(central)});
+
+    // Directions: inner nodes and leaves.
+    std::map<std::string, std::string> direction;
+    for (const auto& [code, parent, name] :
+         {std::tuple{"1", "", "Продажби"}, std::tuple{"11", "1", "Търговия на едро"},
+          std::tuple{"12", "1", "Търговия на дребно"}, std::tuple{"121", "12", "Магазин"},
+          std::tuple{"122", "12", "Онлайн магазин"}, std::tuple{"2", "", "Производство"},
+          std::tuple{"21", "2", "Цех"}}) {
+        direction[code] = keys.next();
+        exec(
+            "INSERT INTO nom_finstruct (ID, P_ID, Code, Name, IsActive) VALUES (?1, ?2, ?3, ?4, "
+            "1)",
+            {Variant(direction[code]), *parent ? Variant(direction.at(parent)) : Variant::null(),
+             Variant(code), Variant(name)});
+    }
+
+    // Roundings.
+    std::vector<std::string> rounds;
+    for (const auto& [name, modulo, reminder, vatIncluded] :
+         {std::tuple{"Без закръгляване", 0, 0, 0}, std::tuple{"Нагоре до 0.10", 10, 0, 0},
+          std::tuple{"Цени .99 с ДДС", 100, 99, 1}}) {
+        rounds.push_back(keys.next());
+        exec(
+            "INSERT INTO nom_roundtypes (ID, Name, Modulo, Reminder, Direction, IsVatIncluded, "
+            "IsDefault, IsActive) VALUES (?1, ?2, ?3, ?4, 1, ?5, ?6, 1)",
+            {Variant(rounds.back()), Variant(name), Variant(modulo), Variant(reminder),
+             Variant(vatIncluded), Variant(rounds.size() == 1 ? 1 : 0)});
+    }
+    // With price types: the supplier price list, and a price list generated
+    // from the default one: ten percent more, fifteen for drinks, in steps of
+    // ten stotinki up.
+    if (priceTypes) {
+        const std::string retail =
+            scalarText(db, "SELECT Value FROM sys_settings WHERE Name = 'DefPriceList_ID'");
+        const std::string supplier = keys.next(), online = keys.next();
+        auto type = db.prepare(
+            "INSERT INTO nom_pricelisttypes (ID, Code, Name, IsPromo, IsActive, IsAutoGener, "
+            "PriceFormType, ParentPlType_ID, RoundType_ID, CU, CD, LU, LD) "
+            "VALUES (?1, ?2, ?3, 0, 1, ?4, ?5, ?6, ?7, ?8, ?9, ?8, ?9)");
+        for (const auto& [id, code, name, generated] :
+             {std::tuple{supplier, "S", "Доставни цени", 0},
+              std::tuple{online, "4", "Онлайн", 1}}) {
+            type->reset();
+            type->bindText(1, id);
+            type->bindText(2, code);
+            type->bindText(3, name);
+            type->bindInt64(4, generated);
+            type->bindInt64(5, generated ? 3 : 1);
+            if (generated && !retail.empty())
+                type->bindText(6, retail);
+            else
+                type->bindNull(6);
+            if (generated)
+                type->bindText(7, rounds[1]);
+            else
+                type->bindNull(7);
+            type->bind(8, admin, guid);
+            type->bind(9, Variant(stamp));
+            type->step();
+        }
+        exec("UPDATE sys_settings SET Value = ?1 WHERE Name = 'SupplPriceList_ID'",
+             {Variant(supplier)});
+        auto markup = db.prepare(
+            "INSERT INTO nom_pricelistdimvalues (ID, PriceListType_ID, ListValue_ID, CoefficientA, "
+            "CoefficientB, IsActive) VALUES (?1, ?2, ?3, ?4, 0, 1)");
+        const std::string drinks =
+            scalarText(db, "SELECT ID FROM nom_dimvalues WHERE Name = 'Напитки'");
+        for (const auto& [value, percent] : {std::pair{std::string(), 10}, std::pair{drinks, 15}}) {
+            if (percent == 15 && value.empty()) continue;
+            markup->reset();
+            markup->bindText(1, keys.next());
+            markup->bindText(2, online);
+            if (value.empty())
+                markup->bindNull(3);
+            else
+                markup->bindText(3, value);
+            markup->bind(4, Variant(Decimal(percent)), price);
+            markup->step();
+        }
+    }
+
+    // The last items: attributes, lots and bills of materials.
+    struct First {
+        std::string id, measure, type;
+    };
+    std::vector<First> first;
+    {
+        auto st = db.prepare(
+            "SELECT i.ID, i.Measure_ID, t.Name FROM nom_items i JOIN nom_itemtypes t ON t.ID = "
+            "i.ItmType_ID ORDER BY i.Code DESC LIMIT 12");
+        while (st->step())
+            first.push_back(
+                {std::string(st->text(0)), std::string(st->text(1)), std::string(st->text(2))});
+    }
+    auto attrs = db.prepare(
+        "UPDATE nom_items SET Intrastat_ID = ?2, DutyTariff_id = ?3, FinStruct_ID = ?4, "
+        "WarrantyPeriod = 24, LifePeriod = ?5 WHERE ID = ?1");
+    auto lot = db.prepare(
+        "INSERT INTO nom_itemlots (ID, Itm_ID, Store_ID, Lot, VendorLot, ExpiryDate, DeliveryDate, "
+        "OriginCountryName, Quantity, PriceAvg, PriceAvgPrev) "
+        "VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?9, ?10, ?11)");
+    const char* countries[] = {"България", "Италия", "Германия"};
+    for (size_t n = 0; n < first.size(); ++n) {
+        attrs->reset();
+        attrs->bindText(1, first[n].id);
+        attrs->bindText(2, defaultIntrastat);
+        attrs->bindText(3, tariffs[n % tariffs.size()]);
+        attrs->bindText(4, direction.at(n % 2 ? "121" : "11"));
+        attrs->bindInt64(5, 6 + static_cast<int64_t>(n % 3) * 6);
+        attrs->step();
+        if (n >= 6 || central.empty()) continue;
+        for (int k = 0; k < 2; ++k) {
+            const int64_t cents = 100 + static_cast<int64_t>(keys.number(5000));
+            lot->reset();
+            lot->bindText(1, keys.next());
+            lot->bindText(2, first[n].id);
+            lot->bindText(3, central);
+            lot->bindText(4, "L" + digits(n + 1, 3) + "-" + std::to_string(k + 1));
+            lot->bindText(5, "V-" + digits(keys.number(100000), 5));
+            lot->bind(6, Variant(makeDate(2025, 3 + k * 6, 1 + static_cast<int>(n))), day);
+            lot->bind(7, Variant(makeDate(2024, 1 + k, 10 + static_cast<int>(n))), day);
+            lot->bindText(8, countries[(n + static_cast<size_t>(k)) % std::size(countries)]);
+            lot->bind(9, Variant(Decimal(static_cast<int64_t>(5 + keys.number(40)))), qty);
+            lot->bind(10, money(cents), price);
+            if (k == 0)
+                lot->bindNull(11);
+            else
+                lot->bind(11, money(cents - 7), price);
+            lot->step();
+        }
+    }
+    // Two products made of the other items among them.
+    std::vector<const First*> products, parts;
+    for (const First& f : first)
+        (f.type == "Продукт" && products.size() < 2 ? products : parts).push_back(&f);
+    auto bom = db.prepare(
+        "INSERT INTO nom_boms (ID, Itm_ID, Name, IsActive, IsDefault, Quantity, CU, CD, LU, LD) "
+        "VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?7, ?8)");
+    auto row = db.prepare(
+        "INSERT INTO nom_bomsdetails (ID, Bom_ID, Itm_ID, RowNo, Measure_ID, Quantity, CU, CD, "
+        "LU, LD) VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?7, ?8)");
+    const char* amounts[] = {"0.5", "2", "0.25", "1.125"};
+    for (size_t p = 0; p < products.size() && parts.size() >= 3; ++p) {
+        for (int b = 0; b < (p == 0 ? 2 : 1); ++b) {
+            const std::string id = keys.next();
+            bom->reset();
+            bom->bindText(1, id);
+            bom->bindText(2, products[p]->id);
+            bom->bindText(3, b == 0 ? "Основна рецепта" : "Алтернативна рецепта");
+            bom->bindInt64(4, b == 0 ? 1 : 0);
+            bom->bindInt64(5, b == 0 ? 1 : 0);
+            bom->bind(6, Variant(Decimal(b == 0 ? 1 : 10)), qty);
+            bom->bind(7, admin, guid);
+            bom->bind(8, Variant(stamp));
+            bom->step();
+            for (int r = 0; r < 3; ++r) {
+                const First& part = *parts[(p + static_cast<size_t>(b + r)) % parts.size()];
+                row->reset();
+                row->bindText(1, keys.next());
+                row->bindText(2, id);
+                row->bindText(3, part.id);
+                row->bindInt64(4, r + 1);
+                row->bindText(5, part.measure);
+                row->bind(6, Variant(*Decimal::parse(amounts[(p + static_cast<size_t>(r)) % 4])),
+                          qty);
+                row->bind(7, admin, guid);
+                row->bind(8, Variant(stamp));
+                row->step();
+            }
+        }
+        recalcBomPrices(db, products[p]->id, kAdminId, stamp);
+        exec(
+            "UPDATE nom_items SET BomCount = (SELECT COUNT(*) FROM nom_boms WHERE Itm_ID = ?1) "
+            "WHERE ID = ?1",
+            {Variant(products[p]->id)});
+    }
 }
 
 }  // namespace pelta::bll

@@ -18,7 +18,8 @@ std::string composeCodeList(const std::vector<std::string>& entries);
 std::string barcodePrefix(std::string_view barcode);
 // Composes the item's BarCodes, BarPrefixes, BarMeasures, SupplCodes and
 // SupplMeasures from its barcodes and supplier codes (in the order they were
-// entered). Every write of an item's codes ends with it.
+// entered), and Categories from its group and its other dimension values.
+// Every write of an item's codes or dimension values ends with it.
 void refreshItemCodeLists(Database& db, const std::string& itemId);
 
 }  // namespace pelta::bll

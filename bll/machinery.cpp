@@ -298,6 +298,7 @@ struct WritePlan {
     // Recordset field -> table column, for the columns the rows carry.
     std::vector<std::pair<int, const TableColumn*>> mapped;
     std::vector<std::pair<const TableColumn*, Variant>> fixed;
+    std::vector<const TableColumn*> derived;
     const TableColumn* key = nullptr;
     const TableColumn* ld = nullptr;
     int keyField = -1;
@@ -329,15 +330,65 @@ WritePlan planWrite(Database& db, Recordset& rs, const TableWrite& spec) {
         if (!c) raise(errc::InvalidProcedureCall, "No column " + name, "Database");
         p.fixed.emplace_back(c, value);
     }
+    for (const std::string& name : spec.derived) {
+        const TableColumn* c = findColumn(p.columns, name);
+        if (!c) raise(errc::InvalidProcedureCall, "No column " + name, "Database");
+        p.derived.push_back(c);
+    }
+    if (!spec.derived.empty() && !spec.derive)
+        raise(errc::InvalidProcedureCall, "Derived columns without a rule", "Database");
     for (size_t f = 0; f < rs.fieldCount(); ++f) {
         const std::string& name = rs.fieldDef(f).name;
-        const TableColumn* c = findColumn(p.columns, name);
-        if (!c || c == p.key || (p.audit && isAuditColumn(name))) continue;
-        bool isFixed = std::any_of(p.fixed.begin(), p.fixed.end(),
-                                   [&](const auto& fx) { return fx.first == c; });
-        if (!isFixed) p.mapped.emplace_back(static_cast<int>(f), c);
+        std::string column = name;
+        bool shadowed = false;
+        for (const auto& [field, col] : spec.columnOf) {
+            if (sameName(field, name)) column = col;
+            // The stored name beside the field that maps to it: the field wins.
+            if (sameName(col, name) && !sameName(field, name) && rs.fieldIndex(field) >= 0)
+                shadowed = true;
+        }
+        if (shadowed) continue;
+        const TableColumn* c = findColumn(p.columns, column);
+        if (!c || c == p.key || (p.audit && isAuditColumn(c->name))) continue;
+        auto isNamed = [&](const std::string& n) { return sameName(n, c->name); };
+        if (std::any_of(spec.readOnly.begin(), spec.readOnly.end(), isNamed)) continue;
+        if (std::any_of(p.fixed.begin(), p.fixed.end(),
+                        [&](const auto& fx) { return fx.first == c; }) ||
+            std::find(p.derived.begin(), p.derived.end(), c) != p.derived.end() ||
+            std::any_of(p.mapped.begin(), p.mapped.end(),
+                        [&](const auto& m) { return m.second == c; }))
+            continue;
+        p.mapped.emplace_back(static_cast<int>(f), c);
     }
     return p;
+}
+
+// The placeholder of a value for `c`: an empty value of a NOT NULL column
+// with a declared default takes the default (schema text, never a request's).
+std::string placeholder(const TableColumn& c, int index) {
+    const std::string mark = "?" + std::to_string(index);
+    if (!c.notNull || c.defaultValue.empty()) return mark;
+    return "COALESCE(" + mark + ", " + c.defaultValue + ")";
+}
+
+// The scope condition with its placeholder numbered `index`; empty without a
+// scope.
+std::string scopeCondition(const TableWrite& spec, int index) {
+    if (spec.scope.empty()) return {};
+    std::string out = spec.scope;
+    const std::string mark = "?" + std::to_string(index);
+    for (size_t at = out.find("{}"); at != std::string::npos; at = out.find("{}", at))
+        out.replace(at, 2, mark);
+    return " AND (" + out + ")";
+}
+
+// The derived values of the current row, checked against the declared columns.
+std::vector<Variant> derivedValues(const TableWrite& spec, const WritePlan& p, Recordset& rs) {
+    if (p.derived.empty()) return {};
+    std::vector<Variant> values = spec.derive(rs);
+    if (values.size() != p.derived.size())
+        raise(errc::InvalidProcedureCall, "Derived values do not match their columns", "Database");
+    return values;
 }
 
 // Runs a write statement, turning constraint failures into refusals.
@@ -387,14 +438,15 @@ WriteResult writeRows(OperationContext& ctx, Recordset& rs, const TableWrite& sp
     };
 
     // Deleted rows.
-    if (p.keyField >= 0) {
+    if (p.keyField >= 0 && spec.deletes) {
         auto del = ctx.db.prepare("DELETE FROM " + ctx.db.quote(spec.table) + " WHERE " +
-                                  ctx.db.quote(p.key->name) + " = ?1");
+                                  ctx.db.quote(p.key->name) + " = ?1" + scopeCondition(spec, 2));
         forEach(RowStatus::Deleted, [&] {
             Variant key = rowValue(rs, p.keyField, true);
             Variant rowId = rowValue(rs, p.rowIdField, true);
             del->reset();
             del->bind(1, key, p.key->type);
+            if (!spec.scope.empty()) del->bind(2, spec.scopeValue);
             try {
                 del->step();
             } catch (const DbError& e) {
@@ -408,25 +460,29 @@ WriteResult writeRows(OperationContext& ctx, Recordset& rs, const TableWrite& sp
     }
 
     // Modified rows.
-    {
+    if (spec.updates) {
         std::string sql = "UPDATE " + ctx.db.quote(spec.table) + " SET ";
         int n = 0;
-        auto set = [&](const std::string& col) {
+        auto set = [&](const TableColumn* c, const std::string& col) {
             if (n) sql += ", ";
             ++n;
-            sql += ctx.db.quote(col) + " = ?" + std::to_string(n);
+            sql += ctx.db.quote(col) + " = " + (c ? placeholder(*c, n) : "?" + std::to_string(n));
         };
         for (auto& m : p.mapped)
-            set(m.second->name);
+            set(m.second, m.second->name);
         for (auto& fx : p.fixed)
-            set(fx.first->name);
+            set(fx.first, fx.first->name);
+        for (const TableColumn* c : p.derived)
+            set(c, c->name);
         if (p.audit) {
-            set("LU");
-            set("LD");
+            set(nullptr, "LU");
+            set(nullptr, "LD");
         }
         sql += " WHERE " + ctx.db.quote(p.key->name) + " = ?" + std::to_string(n + 1);
         const bool checkLd = spec.checkLastChange && p.ld && p.ldField >= 0;
         if (checkLd) sql += " AND " + ctx.db.quote(p.ld->name) + " IS ?" + std::to_string(n + 2);
+        const int scopeIndex = n + (checkLd ? 3 : 2);
+        sql += scopeCondition(spec, scopeIndex);
         std::unique_ptr<Statement> upd;
         forEach(RowStatus::Modified, [&] {
             if (!upd) upd = ctx.db.prepare(sql);
@@ -442,6 +498,11 @@ WriteResult writeRows(OperationContext& ctx, Recordset& rs, const TableWrite& sp
                 upd->bind(++i, v, col->type);
                 values.emplace_back(col->name, v);
             }
+            std::vector<Variant> derivedNow = derivedValues(spec, p, rs);
+            for (size_t d = 0; d < p.derived.size(); ++d) {
+                upd->bind(++i, derivedNow[d], p.derived[d]->type);
+                values.emplace_back(p.derived[d]->name, derivedNow[d]);
+            }
             Variant readLd =
                 p.ldField >= 0 ? rs.originalValue(static_cast<size_t>(p.ldField)) : Variant::null();
             if (p.audit) {
@@ -451,6 +512,7 @@ WriteResult writeRows(OperationContext& ctx, Recordset& rs, const TableWrite& sp
             Variant key = p.keyField >= 0 ? rs.value(static_cast<size_t>(p.keyField)) : Variant();
             upd->bind(++i, key, p.key->type);
             if (checkLd) upd->bind(++i, readLd, stampType);
+            if (!spec.scope.empty()) upd->bind(scopeIndex, spec.scopeValue);
             Variant rowId = rowValue(rs, p.rowIdField, false);
             runWrite(ctx, *upd, spec, values, rowId);
             if (ctx.db.changes() == 0) throw concurrentChange(spec, rowId);
@@ -460,28 +522,28 @@ WriteResult writeRows(OperationContext& ctx, Recordset& rs, const TableWrite& sp
     }
 
     // New rows.
-    {
+    if (spec.inserts) {
         std::string cols, marks;
         int n = 0;
-        auto add = [&](const std::string& col) {
+        auto add = [&](const TableColumn* c, const std::string& col) {
             if (n) {
                 cols += ", ";
                 marks += ", ";
             }
             ++n;
             cols += ctx.db.quote(col);
-            marks += "?" + std::to_string(n);
+            marks += c ? placeholder(*c, n) : "?" + std::to_string(n);
         };
-        add(p.key->name);
+        add(nullptr, p.key->name);
         for (auto& m : p.mapped)
-            add(m.second->name);
+            add(m.second, m.second->name);
         for (auto& fx : p.fixed)
-            add(fx.first->name);
+            add(fx.first, fx.first->name);
+        for (const TableColumn* c : p.derived)
+            add(c, c->name);
         if (p.audit) {
-            add("CU");
-            add("CD");
-            add("LU");
-            add("LD");
+            for (const char* col : {"CU", "CD", "LU", "LD"})
+                add(nullptr, col);
         }
         std::string sql =
             "INSERT INTO " + ctx.db.quote(spec.table) + " (" + cols + ") VALUES (" + marks + ")";
@@ -502,6 +564,11 @@ WriteResult writeRows(OperationContext& ctx, Recordset& rs, const TableWrite& sp
             for (auto& [col, v] : p.fixed) {
                 ins->bind(++i, v, col->type);
                 values.emplace_back(col->name, v);
+            }
+            std::vector<Variant> derivedNow = derivedValues(spec, p, rs);
+            for (size_t d = 0; d < p.derived.size(); ++d) {
+                ins->bind(++i, derivedNow[d], p.derived[d]->type);
+                values.emplace_back(p.derived[d]->name, derivedNow[d]);
             }
             if (p.audit) {
                 for (int k = 0; k < 2; ++k) {

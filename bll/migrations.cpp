@@ -556,12 +556,456 @@ INSERT INTO sys_settings (Name, Kind, Value) VALUES
     ('DefPriceScale', 'Long', '2');
 )sql";
 
+// Everything the item's detail form edits: the remaining attributes of an
+// item, the sub-lists kept with it (supplier prices share the price table
+// under the supplier price-list type), bills of materials with their rows,
+// lots, the reference lists behind the form's lists, and the settings of
+// generated price lists: a generated type takes its prices from a parent
+// type (or, for the last delivery price, from the supplier type) with a
+// mark-up per item, per dimension value or for everything, and rounds them.
+// Optional links are set to NULL when what they point to goes; the links of
+// an item to other items and partners are indexed only where they are set.
+constexpr const char* kMigration6 = R"sql(
+CREATE TABLE nom_dutytariffs (
+    ID GUID NOT NULL PRIMARY KEY,
+    Code VARCHAR(20) NOT NULL UNIQUE,
+    Name VARCHAR(200) NOT NULL,
+    DutyTariffPrc DECIMAL(9,4) NOT NULL DEFAULT 0,
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+
+-- Financial directions: a tree; items take only leaves.
+CREATE TABLE nom_finstruct (
+    ID GUID NOT NULL PRIMARY KEY,
+    P_ID GUID REFERENCES nom_finstruct (ID) ON DELETE CASCADE,
+    Code VARCHAR(20) NOT NULL UNIQUE,
+    Name VARCHAR(200) NOT NULL,
+    IsActive BOOLEAN NOT NULL DEFAULT 1
+);
+CREATE INDEX ix_nom_finstruct_parent ON nom_finstruct (P_ID);
+
+CREATE TABLE nom_intrastat (
+    ID GUID NOT NULL PRIMARY KEY,
+    Code VARCHAR(20) NOT NULL UNIQUE,
+    Name VARCHAR(500) NOT NULL,
+    IsDefault BOOLEAN NOT NULL DEFAULT 0,
+    IsActive BOOLEAN NOT NULL DEFAULT 1
+);
+
+CREATE TABLE nom_shelves (
+    ID GUID NOT NULL PRIMARY KEY,
+    Code VARCHAR(20) NOT NULL UNIQUE,
+    Name VARCHAR(100) NOT NULL,
+    Store_ID GUID REFERENCES nom_stores (ID) ON DELETE SET NULL,
+    IsActive BOOLEAN NOT NULL DEFAULT 1
+);
+
+-- How a formed price is rounded: steps of `Modulo` units of the last decimal
+-- of the price scale (1/-Modulo of a unit when negative), ending in
+-- `Reminder`; `Direction` 1 up, 2 down, 3 to the nearest; `IsVatIncluded`
+-- rounds the price with VAT.
+CREATE TABLE nom_roundtypes (
+    ID GUID NOT NULL PRIMARY KEY,
+    Name VARCHAR(100) NOT NULL UNIQUE,
+    Modulo INTEGER NOT NULL DEFAULT 0,
+    Reminder INTEGER NOT NULL DEFAULT 0,
+    Direction INTEGER NOT NULL DEFAULT 1 CHECK (Direction IN (1, 2, 3)),
+    IsVatIncluded BOOLEAN NOT NULL DEFAULT 0,
+    IsDefault BOOLEAN NOT NULL DEFAULT 0,
+    IsActive BOOLEAN NOT NULL DEFAULT 1
+);
+
+ALTER TABLE nom_pricelisttypes ADD COLUMN IsAutoGener BOOLEAN NOT NULL DEFAULT 0;
+ALTER TABLE nom_pricelisttypes ADD COLUMN PriceFormType INTEGER NOT NULL DEFAULT 1
+    CHECK (PriceFormType IN (1, 2, 3));
+ALTER TABLE nom_pricelisttypes ADD COLUMN ParentPlType_ID GUID
+    REFERENCES nom_pricelisttypes (ID) ON DELETE SET NULL;
+ALTER TABLE nom_pricelisttypes ADD COLUMN CgStore_ID GUID
+    REFERENCES nom_stores (ID) ON DELETE SET NULL;
+ALTER TABLE nom_pricelisttypes ADD COLUMN RoundType_ID GUID
+    REFERENCES nom_roundtypes (ID) ON DELETE SET NULL;
+ALTER TABLE nom_pricelisttypes ADD COLUMN Dimension_ID GUID
+    REFERENCES nom_dimensions (ID) ON DELETE SET NULL;
+
+-- Mark-ups of a price-list type: per dimension value (none: everything) and
+-- per item and measure.
+CREATE TABLE nom_pricelistdimvalues (
+    ID GUID NOT NULL PRIMARY KEY,
+    PriceListType_ID GUID NOT NULL REFERENCES nom_pricelisttypes (ID) ON DELETE CASCADE,
+    ListValue_ID GUID REFERENCES nom_dimvalues (ID) ON DELETE CASCADE,
+    CoefficientA DECIMAL(18,8) NOT NULL DEFAULT 0,
+    CoefficientB DECIMAL(18,8) NOT NULL DEFAULT 0,
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME,
+    UNIQUE (PriceListType_ID, ListValue_ID)
+);
+CREATE INDEX ix_nom_pricelistdimvalues_value ON nom_pricelistdimvalues (ListValue_ID);
+
+CREATE TABLE nom_pricelistitems (
+    ID GUID NOT NULL PRIMARY KEY,
+    PriceListType_ID GUID NOT NULL REFERENCES nom_pricelisttypes (ID) ON DELETE CASCADE,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Measure_ID GUID NOT NULL REFERENCES nom_measures (ID),
+    CoefficientA DECIMAL(18,8) NOT NULL DEFAULT 0,
+    CoefficientB DECIMAL(18,8) NOT NULL DEFAULT 0,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME,
+    UNIQUE (PriceListType_ID, Itm_ID, Measure_ID)
+);
+CREATE INDEX ix_nom_pricelistitems_item ON nom_pricelistitems (Itm_ID);
+
+-- The remaining attributes of an item.
+ALTER TABLE nom_items ADD COLUMN PriceMake INTEGER NOT NULL DEFAULT 0
+    CHECK (PriceMake IN (0, 1, 2));
+ALTER TABLE nom_items ADD COLUMN VolumeNeto DECIMAL(18,6);
+ALTER TABLE nom_items ADD COLUMN VolumeBruto DECIMAL(18,6);
+ALTER TABLE nom_items ADD COLUMN SecItm_ID GUID REFERENCES nom_items (ID) ON DELETE SET NULL;
+ALTER TABLE nom_items ADD COLUMN AccItm_ID GUID REFERENCES nom_items (ID) ON DELETE SET NULL;
+ALTER TABLE nom_items ADD COLUMN WarrantyPeriod INTEGER;
+ALTER TABLE nom_items ADD COLUMN WarrantyMeasure INTEGER NOT NULL DEFAULT 0
+    CHECK (WarrantyMeasure IN (0, 1));
+ALTER TABLE nom_items ADD COLUMN LifePeriod INTEGER;
+ALTER TABLE nom_items ADD COLUMN LifeMeasure INTEGER NOT NULL DEFAULT 0
+    CHECK (LifeMeasure IN (0, 1));
+ALTER TABLE nom_items ADD COLUMN ProducerCg_ID GUID
+    REFERENCES nom_contragents (ID) ON DELETE SET NULL;
+ALTER TABLE nom_items ADD COLUMN ImporterCg_ID GUID
+    REFERENCES nom_contragents (ID) ON DELETE SET NULL;
+ALTER TABLE nom_items ADD COLUMN Ecotax DECIMAL(18,8);
+ALTER TABLE nom_items ADD COLUMN DutyTariff_id GUID
+    REFERENCES nom_dutytariffs (ID) ON DELETE SET NULL;
+ALTER TABLE nom_items ADD COLUMN Intrastat_ID GUID
+    REFERENCES nom_intrastat (ID) ON DELETE SET NULL;
+ALTER TABLE nom_items ADD COLUMN IntrAddMeasure_ID GUID
+    REFERENCES nom_measures (ID) ON DELETE SET NULL;
+ALTER TABLE nom_items ADD COLUMN RowsumPrintOnly BOOLEAN NOT NULL DEFAULT 0;
+ALTER TABLE nom_items ADD COLUMN DefaultLot VARCHAR(50);
+ALTER TABLE nom_items ADD COLUMN DefaultClass VARCHAR(50);
+ALTER TABLE nom_items ADD COLUMN OperatingDetails VARCHAR(1000);
+ALTER TABLE nom_items ADD COLUMN LabelText VARCHAR(1000);
+ALTER TABLE nom_items ADD COLUMN Description VARCHAR(1000);
+ALTER TABLE nom_items ADD COLUMN Kind VARCHAR(100);
+ALTER TABLE nom_items ADD COLUMN Kind2 VARCHAR(100);
+ALTER TABLE nom_items ADD COLUMN Caliber VARCHAR(100);
+ALTER TABLE nom_items ADD COLUMN Caliber2 VARCHAR(100);
+ALTER TABLE nom_items ADD COLUMN Origin VARCHAR(100);
+ALTER TABLE nom_items ADD COLUMN Origin2 VARCHAR(100);
+ALTER TABLE nom_items ADD COLUMN Packing VARCHAR(100);
+ALTER TABLE nom_items ADD COLUMN Packing2 VARCHAR(100);
+ALTER TABLE nom_items ADD COLUMN CcStruct_ID GUID
+    REFERENCES nom_costcenters (ID) ON DELETE SET NULL;
+ALTER TABLE nom_items ADD COLUMN CcOther_ID GUID
+    REFERENCES nom_costcenters (ID) ON DELETE SET NULL;
+ALTER TABLE nom_items ADD COLUMN IsLotRequired BOOLEAN NOT NULL DEFAULT 0;
+ALTER TABLE nom_items ADD COLUMN IsPacking BOOLEAN NOT NULL DEFAULT 0;
+ALTER TABLE nom_items ADD COLUMN VariantParentItm_ID GUID
+    REFERENCES nom_items (ID) ON DELETE SET NULL;
+CREATE INDEX ix_nom_items_secitm ON nom_items (SecItm_ID) WHERE SecItm_ID IS NOT NULL;
+CREATE INDEX ix_nom_items_accitm ON nom_items (AccItm_ID) WHERE AccItm_ID IS NOT NULL;
+CREATE INDEX ix_nom_items_variant ON nom_items (VariantParentItm_ID)
+    WHERE VariantParentItm_ID IS NOT NULL;
+CREATE INDEX ix_nom_items_producer ON nom_items (ProducerCg_ID) WHERE ProducerCg_ID IS NOT NULL;
+CREATE INDEX ix_nom_items_importer ON nom_items (ImporterCg_ID) WHERE ImporterCg_ID IS NOT NULL;
+CREATE INDEX ix_nom_items_dutytariff ON nom_items (DutyTariff_id) WHERE DutyTariff_id IS NOT NULL;
+CREATE INDEX ix_nom_items_intrastat ON nom_items (Intrastat_ID) WHERE Intrastat_ID IS NOT NULL;
+CREATE INDEX ix_nom_items_intrmeasure ON nom_items (IntrAddMeasure_ID)
+    WHERE IntrAddMeasure_ID IS NOT NULL;
+CREATE INDEX ix_nom_items_ccstruct ON nom_items (CcStruct_ID) WHERE CcStruct_ID IS NOT NULL;
+CREATE INDEX ix_nom_items_ccother ON nom_items (CcOther_ID) WHERE CcOther_ID IS NOT NULL;
+CREATE INDEX ix_nom_items_ccproject ON nom_items (ProjectCC_ID) WHERE ProjectCC_ID IS NOT NULL;
+
+-- Prices: a row's currency rate, whether the price includes VAT, a note and
+-- whether it was generated. Supplier prices are the rows of the supplier
+-- price-list type (the setting SupplPriceList_ID), owned by the supplier.
+ALTER TABLE nom_prices ADD COLUMN Rate DECIMAL(18,6);
+ALTER TABLE nom_prices ADD COLUMN IsVat BOOLEAN;
+ALTER TABLE nom_prices ADD COLUMN Note VARCHAR(255);
+ALTER TABLE nom_prices ADD COLUMN IsAutoGener BOOLEAN;
+ALTER TABLE nom_prices ADD COLUMN CU GUID REFERENCES sec_users (ID);
+ALTER TABLE nom_prices ADD COLUMN CD DATETIME;
+ALTER TABLE nom_prices ADD COLUMN LU GUID REFERENCES sec_users (ID);
+
+-- Measure facets: `RatioPerUnits` of the measure equal `RatioCoeff` of the
+-- base measure; `Ratio` (base measures per unit, what the list reads) is kept
+-- as RatioCoeff / RatioPerUnits by the service.
+ALTER TABLE nom_itemsmeasures ADD COLUMN RatioPerUnits DECIMAL(18,6) CHECK (RatioPerUnits > 0);
+ALTER TABLE nom_itemsmeasures ADD COLUMN RatioCoeff DECIMAL(18,6) CHECK (RatioCoeff > 0);
+ALTER TABLE nom_itemsmeasures ADD COLUMN Note VARCHAR(255);
+ALTER TABLE nom_itemsmeasures ADD COLUMN CU GUID REFERENCES sec_users (ID);
+ALTER TABLE nom_itemsmeasures ADD COLUMN CD DATETIME;
+ALTER TABLE nom_itemsmeasures ADD COLUMN LU GUID REFERENCES sec_users (ID);
+ALTER TABLE nom_itemsmeasures ADD COLUMN LD DATETIME;
+UPDATE nom_itemsmeasures SET RatioPerUnits = 1000000, RatioCoeff = Ratio;
+
+-- Barcodes: `Type` 0 (Auto), 1 EAN-13, 2 EAN-8, 3 EAN-128, 4 UPC-A, 5 UPC-E,
+-- -1 a weight-barcode template.
+ALTER TABLE nom_itemsbarcodes ADD COLUMN Note VARCHAR(255);
+ALTER TABLE nom_itemsbarcodes ADD COLUMN IsDef BOOLEAN;
+ALTER TABLE nom_itemsbarcodes ADD COLUMN Type INTEGER NOT NULL DEFAULT 0
+    CHECK (Type BETWEEN -1 AND 5);
+ALTER TABLE nom_itemsbarcodes ADD COLUMN CU GUID REFERENCES sec_users (ID);
+ALTER TABLE nom_itemsbarcodes ADD COLUMN CD DATETIME;
+ALTER TABLE nom_itemsbarcodes ADD COLUMN LU GUID REFERENCES sec_users (ID);
+ALTER TABLE nom_itemsbarcodes ADD COLUMN LD DATETIME;
+UPDATE nom_itemsbarcodes SET Type = -1
+    WHERE BarCode NOT GLOB '*[^0-9wldc.]*' AND BarCode GLOB '*[wldc.]*';
+
+ALTER TABLE nom_itemssupplcodes ADD COLUMN Name VARCHAR(250);
+ALTER TABLE nom_itemssupplcodes ADD COLUMN CU GUID REFERENCES sec_users (ID);
+ALTER TABLE nom_itemssupplcodes ADD COLUMN CD DATETIME;
+ALTER TABLE nom_itemssupplcodes ADD COLUMN LU GUID REFERENCES sec_users (ID);
+ALTER TABLE nom_itemssupplcodes ADD COLUMN LD DATETIME;
+
+-- Related items: a weight (relevance), a note and whether the link is active.
+ALTER TABLE nom_itemssimilar ADD COLUMN LnkWeight INTEGER;
+ALTER TABLE nom_itemssimilar ADD COLUMN Note VARCHAR(255);
+ALTER TABLE nom_itemssimilar ADD COLUMN IsActive BOOLEAN NOT NULL DEFAULT 1;
+ALTER TABLE nom_itemssimilar ADD COLUMN CU GUID REFERENCES sec_users (ID);
+ALTER TABLE nom_itemssimilar ADD COLUMN CD DATETIME;
+ALTER TABLE nom_itemssimilar ADD COLUMN LU GUID REFERENCES sec_users (ID);
+ALTER TABLE nom_itemssimilar ADD COLUMN LD DATETIME;
+
+-- The parts of a composite item.
+ALTER TABLE nom_itemsboms ADD COLUMN SeqNo INTEGER;
+ALTER TABLE nom_itemsboms ADD COLUMN Measure_ID GUID REFERENCES nom_measures (ID);
+ALTER TABLE nom_itemsboms ADD COLUMN GroupName VARCHAR(100);
+ALTER TABLE nom_itemsboms ADD COLUMN CU GUID REFERENCES sec_users (ID);
+ALTER TABLE nom_itemsboms ADD COLUMN CD DATETIME;
+ALTER TABLE nom_itemsboms ADD COLUMN LU GUID REFERENCES sec_users (ID);
+ALTER TABLE nom_itemsboms ADD COLUMN LD DATETIME;
+
+-- The item's values of dimensions other than its group (the group is
+-- nom_items.DimValue_ID).
+CREATE TABLE nom_itemsdimvalues (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Dimension_ID GUID NOT NULL REFERENCES nom_dimensions (ID) ON DELETE CASCADE,
+    ListValue_ID GUID NOT NULL REFERENCES nom_dimvalues (ID) ON DELETE CASCADE,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME,
+    UNIQUE (Itm_ID, ListValue_ID)
+);
+CREATE INDEX ix_nom_itemsdimvalues_value ON nom_itemsdimvalues (ListValue_ID);
+CREATE INDEX ix_nom_itemsdimvalues_dimension ON nom_itemsdimvalues (Dimension_ID);
+
+CREATE TABLE nom_itemsrateprices (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Cg_ID GUID NOT NULL REFERENCES nom_contragents (ID),
+    RatePrice DECIMAL(18,8) NOT NULL,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+CREATE INDEX ix_nom_itemsrateprices_item ON nom_itemsrateprices (Itm_ID);
+CREATE INDEX ix_nom_itemsrateprices_cg ON nom_itemsrateprices (Cg_ID);
+
+CREATE TABLE nom_itemsminquo (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    CgStore_ID GUID NOT NULL REFERENCES nom_stores (ID),
+    MinQuantity DECIMAL(18,6) NOT NULL,
+    MaxQuantity DECIMAL(18,6) NOT NULL,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME,
+    UNIQUE (Itm_ID, CgStore_ID)
+);
+
+CREATE TABLE nom_itemsshelves (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Shelf_ID GUID NOT NULL REFERENCES nom_shelves (ID) ON DELETE CASCADE,
+    SeqNo INTEGER,
+    Note VARCHAR(255),
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+CREATE INDEX ix_nom_itemsshelves_item ON nom_itemsshelves (Itm_ID);
+CREATE INDEX ix_nom_itemsshelves_shelf ON nom_itemsshelves (Shelf_ID);
+
+-- Files attached from the media library, which keeps the files themselves.
+CREATE TABLE nom_itemsattachments (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    SeqNo INTEGER,
+    MediaFileUrl VARCHAR(1000),
+    MediaFile_ID GUID,
+    MediaFileName VARCHAR(255),
+    FolderName VARCHAR(255),
+    MediaThumbData BLOB,
+    Note VARCHAR(255),
+    IsDef BOOLEAN,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+CREATE INDEX ix_nom_itemsattachments_item ON nom_itemsattachments (Itm_ID);
+
+-- Rights of security groups on one item (bits of the framework's
+-- permission editor).
+CREATE TABLE nom_itemspermissions (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Group_ID GUID NOT NULL REFERENCES sec_groups (ID) ON DELETE CASCADE,
+    AllowPerm INTEGER NOT NULL DEFAULT 0,
+    DenyPerm INTEGER NOT NULL DEFAULT 0,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME,
+    UNIQUE (Itm_ID, Group_ID)
+);
+CREATE INDEX ix_nom_itemspermissions_group ON nom_itemspermissions (Group_ID);
+
+CREATE TABLE nom_itemsactivities (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    RowNo INTEGER,
+    Process VARCHAR(100),
+    Activity_ID GUID,
+    Description VARCHAR(1000),
+    PlanTime DECIMAL(18,6),
+    Price DECIMAL(18,8),
+    CcStruct_ID GUID REFERENCES nom_costcenters (ID) ON DELETE SET NULL,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+CREATE INDEX ix_nom_itemsactivities_item ON nom_itemsactivities (Itm_ID);
+CREATE INDEX ix_nom_itemsactivities_cc ON nom_itemsactivities (CcStruct_ID)
+    WHERE CcStruct_ID IS NOT NULL;
+
+CREATE TABLE nom_itemsprefsuppl (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    SeqNo INTEGER,
+    Cg_ID GUID NOT NULL REFERENCES nom_contragents (ID),
+    MinQuantity DECIMAL(18,6),
+    StepQuantity DECIMAL(18,6),
+    Measure_ID GUID NOT NULL REFERENCES nom_measures (ID),
+    Note VARCHAR(255),
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME,
+    UNIQUE (Itm_ID, Cg_ID, Measure_ID)
+);
+CREATE INDEX ix_nom_itemsprefsuppl_cg ON nom_itemsprefsuppl (Cg_ID);
+
+-- The dimensions by which the variants of a main variant are shown
+-- (`DimensionView` 1 to 8).
+CREATE TABLE nom_itemsvariantdef (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    SeqNo INTEGER,
+    Dimension_ID GUID NOT NULL REFERENCES nom_dimensions (ID) ON DELETE CASCADE,
+    DimensionView INTEGER NOT NULL DEFAULT 1 CHECK (DimensionView BETWEEN 1 AND 8),
+    Note VARCHAR(255),
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+CREATE INDEX ix_nom_itemsvariantdef_item ON nom_itemsvariantdef (Itm_ID);
+CREATE INDEX ix_nom_itemsvariantdef_dimension ON nom_itemsvariantdef (Dimension_ID);
+
+-- Bills of materials (recipes) of an item: `Quantity` of the item is made
+-- of the rows; `NumRows` and the totals are kept by the service. A row's
+-- `Itm_ID` is its component.
+CREATE TABLE nom_boms (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Name VARCHAR(100) NOT NULL,
+    IsActive BOOLEAN NOT NULL DEFAULT 1,
+    IsDefault BOOLEAN NOT NULL DEFAULT 0,
+    Quantity DECIMAL(18,6) NOT NULL DEFAULT 1000000 CHECK (Quantity > 0),
+    NumRows INTEGER NOT NULL DEFAULT 0,
+    TotalSum DECIMAL(18,8),
+    TotalWithVat DECIMAL(18,8),
+    Note VARCHAR(255),
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME,
+    UNIQUE (Itm_ID, Name)
+);
+
+CREATE TABLE nom_bomsdetails (
+    ID GUID NOT NULL PRIMARY KEY,
+    Bom_ID GUID NOT NULL REFERENCES nom_boms (ID) ON DELETE CASCADE,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID),
+    RowNo INTEGER,
+    Measure_ID GUID REFERENCES nom_measures (ID),
+    UnitQuantity DECIMAL(18,6),
+    UnitSum DECIMAL(18,8),
+    Quantity DECIMAL(18,6),
+    Price DECIMAL(18,8),
+    TotalSum DECIMAL(18,8),
+    PriceWithVat DECIMAL(18,8),
+    TotalWithVat DECIMAL(18,8),
+    Note VARCHAR(255),
+    SupplPriceLastDate DATE,
+    CU GUID REFERENCES sec_users (ID),
+    CD DATETIME,
+    LU GUID REFERENCES sec_users (ID),
+    LD DATETIME
+);
+CREATE INDEX ix_nom_bomsdetails_bom ON nom_bomsdetails (Bom_ID, RowNo);
+CREATE INDEX ix_nom_bomsdetails_item ON nom_bomsdetails (Itm_ID);
+
+-- Lots of an item in a store: the quantity of the lot and its weighted
+-- average prices (the current one and the last one before it that was not
+-- zero), in the lot's currency (the national one when empty).
+CREATE TABLE nom_itemlots (
+    ID GUID NOT NULL PRIMARY KEY,
+    Itm_ID GUID NOT NULL REFERENCES nom_items (ID) ON DELETE CASCADE,
+    Store_ID GUID NOT NULL REFERENCES nom_stores (ID),
+    Lot VARCHAR(50) NOT NULL,
+    VendorLot VARCHAR(50),
+    ExpiryDate DATE,
+    DeliveryDate DATE,
+    OriginCountryName VARCHAR(100),
+    Quantity DECIMAL(18,6) NOT NULL DEFAULT 0,
+    PriceAvg DECIMAL(18,8),
+    PriceAvgPrev DECIMAL(18,8),
+    Currency_ID GUID REFERENCES nom_currencies (ID) ON DELETE SET NULL,
+    UNIQUE (Itm_ID, Store_ID, Lot)
+);
+CREATE INDEX ix_nom_itemlots_store ON nom_itemlots (Store_ID);
+
+-- The count of bills of materials of each item.
+UPDATE nom_items SET BomCount = 0 WHERE BomCount <> 0;
+
+INSERT OR IGNORE INTO sys_settings (Name, Kind, Value) VALUES
+    ('SupplPriceList_ID', 'Guid', NULL);
+)sql";
+
 constexpr Migration kMigrations[] = {
     {1, "users, groups, rights and settings", kMigration1},
     {2, "currencies, banks and currency rates", kMigration2},
     {3, "items, measures, stores, price lists, balances and discounts", kMigration3},
     {4, "business partners", kMigration4},
     {5, "item details: defaults, scales and store", kMigration5},
+    {6, "item details: every attribute and sub-list, bills of materials, lots, generated prices",
+     kMigration6},
 };
 
 int currentVersion(Database& db) {

@@ -94,6 +94,7 @@ void registerCurrencyOperations(OperationRegistry& r);
 void registerPartnerOperations(OperationRegistry& r);
 void registerItemOperations(OperationRegistry& r);
 void registerItemDetailOperations(OperationRegistry& r);
+void registerItemPricingOperations(OperationRegistry& r);
 
 // --- Lists ---------------------------------------------------------------
 
@@ -148,6 +149,26 @@ struct TableWrite {
     bool checkLastChange = false;
     // Values that every written row takes (a parent key, copied head fields).
     std::vector<std::pair<std::string, Variant>> fixed;
+    // Fields kept in a column of another name: {field, column}. A field named
+    // like such a column is not written when the mapped field is there.
+    std::vector<std::pair<std::string, std::string>> columnOf;
+    // Columns the service keeps itself: never written from the rows.
+    std::vector<std::string> readOnly;
+    // Updates and deletes reach only the rows that satisfy `scope`, in which
+    // "{}" stands for `scopeValue` ("Itm_ID = {}"): a row outside it counts as
+    // gone (18), so a key of another owner's row changes nothing.
+    std::string scope;
+    Variant scopeValue;
+    // Columns computed for every new and modified row: `derive` gets the
+    // recordset on the row and answers their values in the order of
+    // `derived`. A derived column is not also written from a field.
+    std::vector<std::string> derived;
+    std::function<std::vector<Variant>(Recordset& row)> derive;
+    // Which pending rows this write takes; the others stay pending for a
+    // later write (children deleted before their parents, added after).
+    bool deletes = true;
+    bool updates = true;
+    bool inserts = true;
 };
 
 struct WriteResult {
@@ -157,7 +178,9 @@ struct WriteResult {
 
 // Writes the pending rows of `rs` by their status: deleted rows first, then
 // modified, then new (new rows with an empty key get a new key). Columns of
-// the recordset that the table lacks are ignored. Violations raise Refusal.
+// the recordset that the table lacks are ignored; an empty value of a NOT
+// NULL column with a declared default takes the default. Violations raise
+// Refusal.
 WriteResult writeRows(OperationContext& ctx, Recordset& rs, const TableWrite& spec);
 // Stamps LU, LD of an unchanged head whose rows changed, with the same check
 // of the last change. Raises Refusal 18 when the head changed meanwhile.

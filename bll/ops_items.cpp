@@ -1,6 +1,5 @@
 // Items: the list with the sets it computes its columns from, deleting
-// items, linking related items, recalculating bill-of-materials prices and
-// generating cost centres.
+// items, linking related items and generating cost centres.
 #include <algorithm>
 
 #include "bll/columnar.h"
@@ -261,77 +260,6 @@ void updNomItemsSimilar(OperationContext& ctx) {
     }
 }
 
-// The price of an item made by a bill of materials: the sum of its
-// components' prices times their quantities, in the item's own currency and
-// base measure, in the price-list type asked for (the default one when
-// none). Components without such a price leave the item's price as it was.
-void updNomItemsBomPrices(OperationContext& ctx) {
-    ctx.require(kItemsScreen, rights::Edit);
-    std::string plType = ctx.text("PriceList");
-    if (plType.empty()) plType = setting(ctx.db, "DefPriceList_ID");
-    if (plType.empty()) return;
-    const ColumnType price = ColumnType::parse("DECIMAL(18,8)").value();
-    const ColumnType quantity = ColumnType::parse("DECIMAL(18,6)").value();
-    const ColumnType vat = ColumnType::parse("DECIMAL(9,4)").value();
-
-    auto item = ctx.db.prepare(
-        "SELECT DefCurrency_ID, Measure_ID, Vat, VatPriceScale FROM nom_items "
-        "WHERE ID = ?1 AND BomCount > 0");
-    auto parts = ctx.db.prepare(
-        "SELECT b.Quantity, p.BasePrice FROM nom_itemsboms b "
-        "JOIN nom_items c ON c.ID = b.Component_ID "
-        "LEFT JOIN nom_prices p ON p.Itm_ID = b.Component_ID AND p.PlType_ID = ?2 "
-        "AND p.Cg_ID IS NULL AND p.Currency_ID = ?3 AND p.Measure_ID = c.Measure_ID "
-        "WHERE b.Itm_ID = ?1");
-    auto upd = ctx.db.prepare(
-        "UPDATE nom_prices SET BasePrice = ?5, BasePriceWithVat = ?6, LD = ?7 "
-        "WHERE PlType_ID = ?2 AND Cg_ID IS NULL AND Itm_ID = ?1 AND Currency_ID = ?3 "
-        "AND Measure_ID = ?4");
-    auto ins = ctx.db.prepare(
-        "INSERT INTO nom_prices (ID, PlType_ID, Cg_ID, Itm_ID, Currency_ID, Measure_ID, "
-        "BasePrice, BasePriceWithVat, LD) VALUES (?8, ?2, NULL, ?1, ?3, ?4, ?5, ?6, ?7)");
-    for (const std::string& id : splitKeys(ctx.text("Itm_ID"))) {
-        item->reset();
-        item->bindText(1, id);
-        if (!item->step() || item->isNull(0)) continue;
-        const std::string currency(item->text(0));
-        const std::string measure(item->text(1));
-        const Decimal rate = item->value(2, vat).toDecimal();
-        const int scale = std::clamp(static_cast<int>(item->int64(3)), 0, 8);
-
-        parts->reset();
-        parts->bindText(1, id);
-        parts->bindText(2, plType);
-        parts->bindText(3, currency);
-        Decimal sum;
-        bool complete = true, any = false;
-        while (parts->step()) {
-            any = true;
-            if (parts->isNull(1)) {
-                complete = false;
-                break;
-            }
-            sum += parts->value(0, quantity).toDecimal() * parts->value(1, price).toDecimal();
-        }
-        if (!any || !complete) continue;
-        const Decimal base = sum.round(8);
-        const Decimal withVat = (base * (Decimal(1) + rate / Decimal(100))).round(scale);
-        for (auto* st : {upd.get(), ins.get()}) {
-            st->reset();
-            st->bindText(1, id);
-            st->bindText(2, plType);
-            st->bindText(3, currency);
-            st->bindText(4, measure);
-            st->bind(5, Variant(base), price);
-            st->bind(6, Variant(withVat), price);
-            st->bind(7, Variant(ctx.now));
-            if (st == ins.get()) st->bindText(8, newGuidString());
-            st->step();
-            if (st == upd.get() && ctx.db.changes() > 0) break;
-        }
-    }
-}
-
 // A cost centre of "Type" (1: object/project) for each item, named and coded
 // as the item, and the item linked to it; an item that has one keeps it.
 void generNomItemsCostCenters(OperationContext& ctx) {
@@ -423,9 +351,18 @@ void refreshItemCodeLists(Database& db, const std::string& itemId) {
         suppl.emplace_back(sc->text(0));
         supplMeasures.emplace_back(sc->text(1));
     }
+    // The group first, then the values of other dimensions as entered.
+    std::vector<std::string> categories;
+    auto cat = db.prepare(
+        "SELECT DimValue_ID FROM nom_items WHERE ID = ?1 AND DimValue_ID IS NOT NULL "
+        "UNION ALL SELECT * FROM (SELECT ListValue_ID FROM nom_itemsdimvalues WHERE Itm_ID = ?1 "
+        "ORDER BY rowid)");
+    cat->bindText(1, itemId);
+    while (cat->step())
+        categories.emplace_back(cat->text(0));
     auto upd = db.prepare(
         "UPDATE nom_items SET BarCodes = ?2, BarPrefixes = ?3, BarMeasures = ?4, "
-        "SupplCodes = ?5, SupplMeasures = ?6 WHERE ID = ?1");
+        "SupplCodes = ?5, SupplMeasures = ?6, Categories = ?7 WHERE ID = ?1");
     upd->bindText(1, itemId);
     auto text = [&](int index, const std::vector<std::string>& list) {
         if (list.empty())
@@ -438,6 +375,7 @@ void refreshItemCodeLists(Database& db, const std::string& itemId) {
     text(4, measures);
     text(5, suppl);
     text(6, supplMeasures);
+    text(7, categories);
     upd->step();
 }
 
@@ -445,7 +383,6 @@ void registerItemOperations(OperationRegistry& r) {
     r.add("GetNomItems", &getNomItems, false);
     r.add("DelNomItems", &delNomItems, true);
     r.add("UpdNomItemsSimilar", &updNomItemsSimilar, true);
-    r.add("UpdNomItemsBomPrices", &updNomItemsBomPrices, true);
     r.add("GenerNomItemsCostCenters", &generNomItemsCostCenters, true);
     registerList(kItemsScreen, kItemsList);
     registerItemDetailOperations(r);

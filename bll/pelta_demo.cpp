@@ -1,6 +1,6 @@
 // pelta-demo: creates a demo database file.
 //   pelta-demo FILE [--banks N] [--days N] [--currencies N] [--partners N] [--items N]
-//              [--seed N]
+//              [--generated-prices 0|1] [--seed N]
 #include <cstdlib>
 #include <cstring>
 #include <iostream>
@@ -13,8 +13,7 @@ namespace {
 
 int usage() {
     std::cerr << "usage: pelta-demo FILE [--banks N] [--days N] [--currencies N] [--partners N] "
-                 "[--items N] "
-                 "[--seed N]\n";
+                 "[--items N] [--generated-prices 0|1] [--seed N]\n";
     return 2;
 }
 
@@ -42,6 +41,8 @@ int main(int argc, char** argv) {
             o.partners = static_cast<int>(v);
         else if (std::strcmp(argv[i], "--items") == 0 && v <= 1000000)
             o.items = static_cast<int>(v);
+        else if (std::strcmp(argv[i], "--generated-prices") == 0 && v <= 1)
+            o.generatedPrices = v == 1;
         else if (std::strcmp(argv[i], "--seed") == 0)
             o.seed = static_cast<uint64_t>(v);
         else

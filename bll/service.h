@@ -97,12 +97,16 @@ struct DemoOptions {
     int currenciesPerRate = 4;  // rows per rate record (at most the currencies known)
     int partners = 40;          // business partners
     int items = 40;             // items of the catalogue (0 to 1,000,000)
+    // The supplier price-list type and a type generated from the default one
+    // with its mark-ups (offered among the price-list types everywhere).
+    bool generatedPrices = false;
     uint64_t seed = 20240101;
 };
 // Fills an empty, migrated database: users `admin` (administrators) and
 // `operator` (may open currency rates, not change them), currencies, banks,
 // rates, the application parameters, and a catalogue of `items` items with
-// their measures, barcodes, supplier codes, prices, stock and discounts (see
+// their measures, barcodes, supplier codes, prices, stock and discounts, the
+// reference lists of the item's form, lots and bills of materials (see
 // demo_items.cpp). One transaction, prepared statements.
 void generateDemo(Database& db, const DemoOptions& options = {});
 // Creates the file at `path` (replacing nothing: raises when it exists) and

@@ -352,7 +352,8 @@ public:
     }
 
     std::vector<TableColumn> columns(std::string_view table) override {
-        auto st = prepare("SELECT name, type, \"notnull\", pk FROM pragma_table_info(?1)");
+        auto st =
+            prepare("SELECT name, type, \"notnull\", pk, dflt_value FROM pragma_table_info(?1)");
         st->bindText(1, table);
         std::vector<TableColumn> out;
         while (st->step()) {
@@ -362,6 +363,7 @@ public:
             c.type = ColumnType::parse(c.declared).value_or(ColumnType{});
             c.notNull = st->int64(2) != 0;
             c.primaryKey = st->int64(3) != 0;
+            if (!st->isNull(4)) c.defaultValue = st->text(4);
             out.push_back(std::move(c));
         }
         return out;

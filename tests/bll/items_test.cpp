@@ -1,6 +1,6 @@
 // The item operations of the service: the sets of "GetNomItems", deleting
-// items, related items, bill-of-materials prices, cost centres, the code
-// lists kept on each item and the demo catalogue.
+// items, related items, cost centres, the code lists kept on each item and
+// the demo catalogue.
 #include "bll/items.h"
 #include "bll/columnar.h"
 #include "bll/operations.h"
@@ -113,40 +113,6 @@ TEST_F(ItemsBllTest, RelatedItemsAreLinkedBothWaysOnce) {
     request.writeProperty(
         "ID", Variant(itemId("0000001") + "\x01{00000000-0000-0000-0000-00000000000F}"));
     EXPECT_EQ(call(*admin_, "UpdNomItemsSimilar", &request).bllError(), 19);
-}
-
-TEST_F(ItemsBllTest, BomPriceIsTheExactSumOfItsComponents) {
-    const std::string product = itemId("0000001");
-    auto ins = admin_->database().prepare(
-        "INSERT INTO nom_itemsboms (ID, Itm_ID, Component_ID, Quantity) VALUES (?1, ?2, ?3, ?4)");
-    const pelta::bll::ColumnType qty = pelta::bll::ColumnType::parse("DECIMAL(18,6)").value();
-    auto add = [&](const std::string& code, const char* q) {
-        ins->reset();
-        ins->bindText(1, pelta::newGuidString());
-        ins->bindText(2, product);
-        ins->bindText(3, itemId(code));
-        ins->bind(4, Variant(*pelta::Decimal::parse(q)), qty);
-        ins->step();
-    };
-    add("0000002", "0.333333");
-    add("0000003", "3");
-    admin_->database().execute("UPDATE nom_items SET BomCount = 2 WHERE Code = '0000001'");
-    auto price = [&](const std::string& code) {
-        return scalar(
-                   "SELECT p.BasePrice FROM nom_prices p JOIN nom_items i ON i.ID = p.Itm_ID "
-                   "AND p.Currency_ID = i.DefCurrency_ID AND p.Measure_ID = i.Measure_ID "
-                   "JOIN sys_settings s ON s.Name = 'DefPriceList_ID' AND s.Value = p.PlType_ID "
-                   "WHERE i.Code = ?1",
-                   {Variant(code)})
-            .toDecimal();
-    };
-    const pelta::Decimal expected =
-        price("0000002") * *pelta::Decimal::parse("0.333333") / pelta::Decimal(100000000) +
-        price("0000003") * pelta::Decimal(3) / pelta::Decimal(100000000);
-    pelta::PropertyBag request;
-    request.writeProperty("Itm_ID", Variant(product + "\x01" + itemId("0000004")));
-    EXPECT_EQ(call(*admin_, "UpdNomItemsBomPrices", &request).bllError(), 0);
-    EXPECT_EQ(price("0000001") / pelta::Decimal(100000000), expected.round(8));
 }
 
 TEST_F(ItemsBllTest, CostCentresAreMadeOncePerItem) {
