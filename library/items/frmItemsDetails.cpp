@@ -235,6 +235,14 @@ bool frmItemsDetails::pvIsModified() {
     if (m_sKey.empty() && (m_bFromCopy || m_bUploaded)) return true;
     for (const auto& [name, grid] : m_oGrids)
         if (grid->EditState()) return true;
+    // Lists changed without a grid: bills of materials, rows of a copy.
+    for (const std::string& name : SubLists()) {
+        auto rows = Rows(name);
+        if (!rows || rows->recordCount() == 0) continue;
+        auto r = rows->clone();
+        r->setFilter(pelta::FilterGroup::Pending);
+        if (r->recordCount() > 0) return true;
+    }
     return false;
 }
 
@@ -345,7 +353,7 @@ bool frmItemsDetails::pvCheckLists() {
     // One price per price-list type, supplier and measure.
     auto prices = Rows("PriceList");
     if (prices && prices->fieldIndex("Measure_ID") >= 0) {
-        const char* type = prices->fieldIndex("PriceList_ID") >= 0 ? "PriceList_ID" : "PlType_ID";
+        const char* type = "PriceList_ID";
         const bool hasSupplier = prices->fieldIndex("Cg_ID") >= 0;
         // A type holds a price per currency as well.
         const bool hasCurrency = prices->fieldIndex("Currency_ID") >= 0;
@@ -399,7 +407,10 @@ void frmItemsDetails::pvUpload() {
             if (r->status() != pelta::RowStatus::New) continue;
             if (C2Str(r->value("ID")).empty())
                 r->setValue("ID", pelta::Variant(pelta::newGuidString()));
-            if (r->fieldIndex("Itm_ID") >= 0) r->setValue("Itm_ID", pelta::Variant(id));
+            // A bill's rows name their component in Itm_ID, and the bills
+            // that use the item are not the item's own rows.
+            if (r->fieldIndex("Itm_ID") >= 0 && name != "BomsDetails" && name != "ItemMaterialBoms")
+                r->setValue("Itm_ID", pelta::Variant(id));
             r->update();
         }
     }

@@ -115,6 +115,12 @@ describe('pelta serve', () => {
   const list = () => page.locator('section.screen[data-kind=list]');
   const form = () => page.locator('section.screen[data-kind=detail]');
   const footer = (n) => list().locator('.footer', { hasText: new RegExp(`Записи: ${n}$`) });
+  // An attribute of the shown detail form typed and sent with Enter.
+  const commitAttribute = async (field, value) => {
+    const input = page.locator(`section.screen[data-kind=detail]:not([hidden]) input[name=${field}]`);
+    await input.fill(value);
+    await Promise.all([page.waitForResponse((r) => r.url().includes('/attributes')), input.press('Enter')]);
+  };
 
   test('the navigation offers the library\'s lists; one not made yet says so', async () => {
     const ratios = page.locator('#lists a[data-list="PeltaNom15.ctxRatios"]');
@@ -219,7 +225,7 @@ describe('pelta serve', () => {
     assert.equal(await field('txtName').inputValue(), name);
     assert.equal(await field('txtCode').inputValue(), '0000007');
     await field('txtName').fill(`${name} (нов)`);
-    await field('attName2').fill('Браузърно второ име');
+    await commitAttribute('Name2', 'Браузърно второ име');
     await page.screenshot({ path: path.join(shotDir, 'pelta-item-form.png'), fullPage: true });
     await page.keyboard.press('Control+s');
     await page.locator('#status', { hasText: 'Записано' }).waitFor();
@@ -233,6 +239,40 @@ describe('pelta serve', () => {
 
     await find('');
     await itemsFooter(40).waitFor();
+  });
+
+  test('a new product is refused without a name, then saved with a barcode and found', async () => {
+    const items = page.locator('section.screen[data-kind=list]:not([hidden])');
+    await page.locator('.tab', { hasText: 'Продукти и материали' }).click();
+    await items.locator('.ag-row').first().click();
+    await page.keyboard.press('Control+n');
+    const detail = page.locator('section.screen[data-kind=detail]:not([hidden])');
+    await detail.locator('[data-control=txtCode]').waitFor();
+    assert.equal(await detail.locator('[data-control=txtCode]').inputValue(), '');
+    // The defaults of a new product: VAT group "Б" among the attributes.
+    assert.equal(await detail.locator('select[name=TaxGroup] option:checked').textContent(), 'Б');
+    await commitAttribute('Name2', 'Second name');
+    await page.keyboard.press('Control+s');
+    await answerDialog(page, 'Невалидно име', 'OK');
+    await detail.locator('[data-control=txtName]').fill('Браузърен продукт');
+    await detail.locator('nav.form-tree button[data-node="Баркодове"]').click();
+    const barcodes = detail.locator('.grid[data-grid=geBarCodes]');
+    await barcodes.waitFor();
+    await barcodes.locator('button[data-action=addrow]').click();
+    await barcodes.locator('tbody tr').last().locator('input[name=Code]').fill('3800000000994');
+    await page.screenshot({ path: path.join(shotDir, 'pelta-item-new.png'), fullPage: true });
+    await page.keyboard.press('Control+s');
+    await page.locator('#status', { hasText: 'Записано' }).waitFor();
+    assert.notEqual(await detail.locator('[data-control=txtCode]').inputValue(), '', 'the service numbered it');
+
+    await page.locator('.tab', { hasText: 'Продукти и материали' }).click();
+    const search = items.locator('.quick-filter input[name=filter-802]');
+    await search.fill('Браузърен');
+    await search.press('Enter');
+    await items.locator('.footer', { hasText: /Записи: 1$/ }).waitFor();
+    await items.locator('.ag-row', { hasText: 'Браузърен продукт' }).waitFor();
+    await search.fill('');
+    await search.press('Enter');
   });
 
   test('a closed tab releases its session and terminates its screens', async () => {

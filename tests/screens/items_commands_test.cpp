@@ -81,11 +81,16 @@ TEST_F(ItemsCommandsTest, BomPricesOnlyForItemsWithABillOfMaterials) {
     auto* menu = f();
     row("0000001");
     EXPECT_FALSE(menu->command(352)->enabled);
-    const std::string product = itemId("0000001");
-    for (const char* part : {"0000002", "0000003"})
-        exec("INSERT INTO nom_itemsboms (ID, Itm_ID, Component_ID, Quantity) VALUES ('" +
-                 pelta::newGuidString() + "', ?1, ?2, 2500000)",
-             Variant(product), Variant(itemId(part)));
+    const std::string product = itemId("0000001"), bill = pelta::newGuidString();
+    exec("INSERT INTO nom_boms (ID, Itm_ID, Name, Quantity) VALUES (?1, ?2, 'Основна', 1000000)",
+         Variant(bill), Variant(product));
+    // Two parts of 2.5 each at a standard price of 1.50 (stored scaled).
+    for (const char* part : {"0000002", "0000003"}) {
+        exec("INSERT INTO nom_bomsdetails (ID, Bom_ID, Itm_ID, Quantity, Price) VALUES ('" +
+                 pelta::newGuidString() + "', ?1, ?2, 2500000, 0)",
+             Variant(bill), Variant(itemId(part)));
+        exec("UPDATE nom_items SET RatePrice = 150000000 WHERE ID = ?1", Variant(itemId(part)));
+    }
     exec("UPDATE nom_items SET BomCount = 1 WHERE ID = ?1", Variant(product));
     refresh();
     row("0000002");
@@ -94,12 +99,10 @@ TEST_F(ItemsCommandsTest, BomPricesOnlyForItemsWithABillOfMaterials) {
     EXPECT_TRUE(menu->command(352)->enabled);
     run(352);
     EXPECT_EQ(connection->calls["UpdNomItemsBomPrices"], 1);
-    const std::string bgn = currency("BGN"), piece = measure("бр");
-    const auto expected = (RetailPrice("0000002", bgn, piece) * D("2.5") +
-                           RetailPrice("0000003", bgn, piece) * D("2.5"))
-                              .round(8);
-    EXPECT_EQ(RetailPrice("0000001", bgn, piece), expected);
-    EXPECT_EQ(cell("0000001", "BasePrice"), norm(expected)) << "the list shows the new price";
+    EXPECT_EQ(ItemsTest::count("SELECT COUNT(*) FROM nom_bomsdetails WHERE Price = 150000000"), 2);
+    EXPECT_EQ(ItemsTest::count("SELECT TotalSum FROM nom_boms WHERE ID = ?1", Variant(bill)),
+              750000000)
+        << "the bill costs 2 x 2.5 x 1.50";
 }
 
 TEST_F(ItemsCommandsTest, CostCentresAreGeneratedForTheSelectedItems) {

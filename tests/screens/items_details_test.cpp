@@ -81,7 +81,8 @@ TEST_F(ItemDetailsTest, ChecksComeInTheirOrderAndNothingIsSentUntilAllPass) {
     auto* mg = grid(d->Grid("geMeasures"));
     mg->addRow();
     mg->editCell("Measure_ID", pelta::Variant(measure("кг")));
-    mg->editCell("Ratio", pelta::Variant(pelta::Decimal(5)));
+    mg->editCell("RatioPerUnits", pelta::Variant(pelta::Decimal(1)));
+    mg->editCell("RatioCoeff", pelta::Variant(pelta::Decimal(5)));
     ASSERT_TRUE(mg->commitRow());
 
     d->Attributes()->UserSetValue("BasicMeasureScale", pelta::Variant(5));
@@ -148,7 +149,7 @@ TEST_F(ItemDetailsTest, AnEditIsSavedAndTheListRowRefreshedWithoutReadingTheList
     ASSERT_TRUE(d->Tree()->SelectNode("Баркодове"));
     auto* bg = grid(d->Grid("geBarCodes"));
     bg->addRow();
-    bg->editCell("BarCode", pelta::Variant("3800000000017"));
+    bg->editCell("Code", pelta::Variant("3800000000017"));
     ASSERT_TRUE(bg->commitRow());
     EXPECT_TRUE(f(d)->isModified());
     ASSERT_TRUE(d->FormExtender()->SaveDocument()) << agent->last().text;
@@ -191,7 +192,7 @@ TEST_F(ItemDetailsTest, DuplicatesAreToldByTheirKindAndTheEditsStay) {
     ASSERT_TRUE(d->Tree()->SelectNode("Баркодове"));
     auto* bg = grid(d->Grid("geBarCodes"));
     bg->addRow();
-    bg->editCell("BarCode", pelta::Variant("3800000000024"));
+    bg->editCell("Code", pelta::Variant("3800000000024"));
     ASSERT_TRUE(bg->commitRow());
     shown = refused(d);
     EXPECT_EQ(shown.text, "Вече съществува баркод на продукт '" + owner + "' с този код.");
@@ -199,7 +200,7 @@ TEST_F(ItemDetailsTest, DuplicatesAreToldByTheirKindAndTheEditsStay) {
     EXPECT_EQ(count("SELECT COUNT(*) FROM nom_items WHERE Name = 'Двойник'"), 0)
         << "nothing of a refused save is written";
 
-    bg->editCell("BarCode", pelta::Variant("3800000000031"));
+    bg->editCell("Code", pelta::Variant("3800000000031"));
     ASSERT_TRUE(bg->commitRow());
     agent->clear();
     ASSERT_TRUE(d->FormExtender()->SaveDocument()) << agent->last().text;
@@ -249,7 +250,7 @@ TEST_F(ItemDetailsTest, ARepeatedPriceOfATypeIsRefusedBeforeTheServiceIsCalled) 
     prices->moveFirst();
     std::vector<std::pair<std::string, pelta::Variant>> row;
     for (const char* field :
-         {"PlType_ID", "Cg_ID", "Currency_ID", "Measure_ID", "BasePrice", "BasePriceWithVat"})
+         {"PriceList_ID", "Cg_ID", "Currency_ID", "Measure_ID", "BasePrice", "BasePriceWithVat"})
         row.emplace_back(field, prices->value(field));
     prices->addNew();
     prices->setValue("ID", pelta::Variant(pelta::newGuidString()));
