@@ -263,7 +263,13 @@ describe('pelta serve', () => {
     await page.screenshot({ path: path.join(shotDir, 'pelta-item-new.png'), fullPage: true });
     await page.keyboard.press('Control+s');
     await page.locator('#status', { hasText: 'Записано' }).waitFor();
-    assert.notEqual(await detail.locator('[data-control=txtCode]').inputValue(), '', 'the service numbered it');
+    // The saved state comes back with the code the service gave it.
+    let code = '';
+    for (let i = 0; i < 100 && code === ''; i++) {
+      code = await detail.locator('[data-control=txtCode]').inputValue();
+      if (code === '') await page.waitForTimeout(50);
+    }
+    assert.match(code, /^\d+$/, 'the service numbered it');
 
     await page.locator('.tab', { hasText: 'Продукти и материали' }).click();
     const search = items.locator('.quick-filter input[name=filter-802]');
