@@ -373,6 +373,15 @@ bool GridExtender::editCell(const std::string& column, const pelta::Variant& val
     return true;
 }
 
+bool GridExtender::SetCurrentValue(const std::string& Column, const pelta::Variant& Value) {
+    if (!HasCurrentRow()) return false;
+    std::string field = fieldOf(Column);
+    if (field.empty()) field = Column;
+    if (view_->fieldIndex(field) < 0) return false;
+    view_->setValue(field, Value);
+    return true;
+}
+
 void GridExtender::addRow() {
     if (!view_)
         pelta::raise(pelta::errc::ObjectVariableNotSet, "No rows are bound to " + gridName_);

@@ -56,6 +56,7 @@ public:
     bool SetCurrentBookmark(const pelta::Variant& Bookmark) override;
     // Searches the grid's rows from the first; stays put when nothing matches.
     bool MoveToRow(const std::string& Criterion) override;
+    bool SetCurrentValue(const std::string& Column, const pelta::Variant& Value) override;
 
     bool MultiSelect() override { return multiSelect_; }
     void SetMultiSelect(bool MultiSelect) override;

@@ -209,6 +209,10 @@ public:
     virtual bool SetCurrentBookmark(const pelta::Variant& Bookmark) = 0;
     // Positions on the first row matching a criterion ("ID='{...}'").
     virtual bool MoveToRow(const std::string& Criterion) = 0;
+    // The screen's own change of a cell of the current row (a value computed
+    // from another cell), without column events; False without a current row
+    // or such a column.
+    virtual bool SetCurrentValue(const std::string& Column, const pelta::Variant& Value) = 0;
 
     // Marked (selected) rows.
     virtual bool MultiSelect() = 0;

@@ -64,6 +64,7 @@ private:
     void pvRefreshLots();
     void pvOpenDocuments(const std::string& NodeKey);
     void pvProposePrices();
+    void pvPriceWithVat(IGridExtender& Grid, const std::string& Column);
     void pvPickAttribute(const std::string& Field);
 
     // bills of materials (frmItemsDetailsBoms.cpp)

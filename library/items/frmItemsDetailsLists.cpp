@@ -1,6 +1,7 @@
 // The item editor's tree of lists: each node shows one grid over one of the
 // item's lists, filled when the node is first shown; document nodes open the
 // list controls of the suite's other libraries filtered by the item.
+#include <algorithm>
 #include <string_view>
 
 #include "library/contracts/Constants.h"
@@ -10,6 +11,8 @@
 #include "library/frame/mdErrorHandling.h"
 #include "library/frame/mdGlobals.h"
 #include "library/items/frmItemsDetails.h"
+#include "platform/automation/error.h"
+#include "platform/automation/guid.h"
 #include "platform/data/propertybag.h"
 #include "platform/data/recordset.h"
 
@@ -275,6 +278,32 @@ bool frmItemsDetails::pvCreateLists() {
                   "дименсия|6|Изображение на стойност на дименсия и цена|7|Падащ списък със "
                   "стойност на дименсия|8|Падащ списък със стойност на дименсия и цена"),
         "ID", {"Name"});
+    for (const char* name : {"gePriceList", "geSupplPrice"}) {
+        IGridExtender* prices = m_oGrids[name].get();
+        prices->Events().AfterColUpdate = [this, prices](const std::string& Column) {
+            try {
+                pvPriceWithVat(*prices, Column);
+            } catch (...) {
+                ShowError("m_oGridPrices_AfterColUpdate", kObjectName, "Продукт/материал");
+            }
+        };
+    }
+    m_oGrids["gePriceList"]->Events().AfterUpdate = [this] {
+        try {
+            pvProposePrices();
+        } catch (...) {
+            ShowError("m_oGridPriceList_AfterUpdate", kObjectName, "Продукт/материал");
+        }
+    };
+    // Generated rows are the service's proposals.
+    m_oGrids["gePriceList"]->Events().RowFormat = [this](RowFormatArgs& Args) {
+        auto rows = Rows("PriceList");
+        if (!rows) return;
+        auto r = rows->clone();
+        r->setBookmark(Args.Bookmark);
+        if (r->fieldIndex("IsAutoGener") >= 0 && C2Bool(r->value("IsAutoGener")))
+            Args.RowStyle = "Inactive";
+    };
     m_oGrids["geLotsSaldo"]->Events().RowFormat = [this](RowFormatArgs& Args) {
         auto rows = Rows("ItemLotsSaldo");
         if (!rows) return;
@@ -490,6 +519,79 @@ void frmItemsDetails::pvPickAttribute(const std::string& Field) {
         m_oAttribExt->SetShownText(Field, C2Str(c->value("Name")));
 }
 
-void frmItemsDetails::pvProposePrices() {}
+// The price with VAT follows the price (and the price the price with VAT) by
+// the item's VAT rate, to the item's decimals of prices with VAT.
+void frmItemsDetails::pvPriceWithVat(IGridExtender& Grid, const std::string& Column) {
+    if (Column != "BasePrice" && Column != "IsVat" && Column != "BasePriceWithVat") return;
+    pelta::Decimal vat;
+    try {
+        const pelta::Variant v = m_rsHead->value("Vat");
+        if (!v.isNull() && !v.isEmpty()) vat = v.toDecimal();
+    } catch (const pelta::Error&) {
+        return;
+    }
+    const pelta::Decimal factor = pelta::Decimal(1) + vat / pelta::Decimal(100);
+    pelta::Variant scale = m_rsHead->fieldIndex("VatPriceScale") >= 0
+                               ? m_rsHead->value("VatPriceScale")
+                               : pelta::Variant();
+    if (scale.isNull() || scale.isEmpty()) scale = pvParameter("DefVatPriceScale");
+    const int32_t decimals =
+        scale.isNull() || scale.isEmpty() ? 2 : std::clamp<int32_t>(C2Lng(scale), 0, 8);
+    const bool fromPrice = Column != "BasePriceWithVat";
+    const pelta::Variant given = Grid.CurrentValue(fromPrice ? "BasePrice" : "BasePriceWithVat");
+    if (given.isNull() || given.isEmpty()) return;
+    const pelta::Decimal value = given.toDecimal();
+    if (fromPrice)
+        Grid.SetCurrentValue("BasePriceWithVat", pelta::Variant((value * factor).round(decimals)));
+    else if (!factor.isZero())
+        Grid.SetCurrentValue("BasePrice", pelta::Variant((value / factor).round(8)));
+}
+
+// A price of a type that generated price lists are formed on: the service
+// proposes their rows, which replace the generated rows of the same type and
+// measure (or are added).
+void frmItemsDetails::pvProposePrices() {
+    auto* grid = m_oGrids["gePriceList"].get();
+    auto prices = Rows("PriceList");
+    if (!grid->HasCurrentRow() || !prices || C2Bool(grid->CurrentValue("IsAutoGener"))) return;
+    const std::string type = C2Str(grid->CurrentValue("PriceList_ID"));
+    const pelta::Variant price = grid->CurrentValue("BasePrice");
+    if (type.empty() || price.isNull() || price.isEmpty()) return;
+    auto request = CreatePropertyBag(m_oForm.get());
+    request->writeProperty("PriceListType", pelta::Variant(type));
+    request->writeProperty("Price", price);
+    request->writeProperty("Itm_ID", m_rsHead->value("ID"));
+    request->writeProperty("Measure", grid->CurrentValue("Measure_ID"));
+    request->writeProperty("VAT", pelta::Variant(C2Bool(grid->CurrentValue("IsVat"))));
+    if (auto dims = Rows("ItemsDimensions"))
+        request->writeProperty("ItemsDimensions", pelta::Variant(pelta::ObjectRef(dims)));
+    auto response =
+        CallBll(m_oForm.get(), m_oConnection.get(), "GetNomItemPlProposal", request.get());
+    if (!response) return;
+    auto proposed = RecordsetProperty(response.get(), "List");
+    if (!proposed || proposed->recordCount() == 0) return;
+    for (proposed->moveFirst(); !proposed->eof(); proposed->moveNext()) {
+        const std::string generated = C2Str(proposed->value("PriceList_ID"));
+        auto row = prices->clone();
+        row->setFilter("PriceList_ID = '" + SqlQuote(generated) + "' AND IsAutoGener = True");
+        const std::string measure = C2Str(proposed->value("Measure_ID"));
+        if (row->recordCount() > 0) row->moveFirst();
+        while (!row->eof() && (row->status() == pelta::RowStatus::Deleted ||
+                               C2Str(row->value("Measure_ID")) != measure))
+            row->moveNext();
+        if (row->eof()) {
+            row->clearFilter();
+            row->addNew();
+            row->setValue("ID", pelta::Variant(pelta::newGuidString()));
+        }
+        for (size_t i = 0; i < proposed->fieldCount(); ++i) {
+            const std::string& field = proposed->fieldDef(i).name;
+            if (field != "ID" && row->fieldIndex(field) >= 0)
+                row->setValue(field, proposed->value(i));
+        }
+        row->update();
+    }
+    grid->Refresh();
+}
 
 }  // namespace PeltaNom15

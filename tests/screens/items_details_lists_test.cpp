@@ -151,6 +151,55 @@ TEST_F(ItemListsTest, TheBillsArePricedByTheServiceAfterUnsavedEditsAreSaved) {
     EXPECT_EQ(liveRows(d->Rows("Boms")), 1);
 }
 
+TEST_F(ItemListsTest, APriceOfABaseTypeBringsTheRowsOfTheListsGeneratedFromIt) {
+    const std::string base = text("SELECT ID FROM nom_pricelisttypes ORDER BY Code LIMIT 1");
+    const std::string online = pelta::newGuidString();
+    exec(
+        "INSERT INTO nom_pricelisttypes (ID, Code, Name, IsActive, IsAutoGener, PriceFormType, "
+        "ParentPlType_ID) VALUES (?1, 'ONL', 'Онлайн', 1, 1, 3, ?2)",
+        pelta::Variant(online), pelta::Variant(base));
+    // 10 % on everything (stored with eight decimals).
+    exec(
+        "INSERT INTO nom_pricelistdimvalues (ID, PriceListType_ID, CoefficientA, CoefficientB) "
+        "VALUES ('" +
+            pelta::newGuidString() + "', ?1, 1000000000, 0)",
+        pelta::Variant(online));
+    auto* d = savedItem("Продукт с генерирани цени");
+    ASSERT_NE(d, nullptr);
+    ASSERT_TRUE(tree(d)->SelectNode("PriceList"));
+    auto* prices = grid(d->Grid("gePriceList"));
+    prices->addRow();
+    prices->editCell("PriceList_ID", pelta::Variant(base));
+    prices->editCell("Measure_ID", pelta::Variant(measure("бр")));
+    prices->editCell("Currency_ID", pelta::Variant(currency("BGN")));
+    prices->editCell("BasePrice", pelta::Variant(pelta::Decimal(10)));
+    EXPECT_EQ(prices->CurrentValue("BasePriceWithVat").toDecimal(), pelta::Decimal(12))
+        << "the price with VAT follows the price at the item's 20 %";
+    ASSERT_TRUE(prices->commitRow());
+    auto generated = [&] {
+        auto r = d->Rows("PriceList")->clone();
+        r->setFilter("PriceList_ID = '" + online + "'");
+        return r;
+    };
+    ASSERT_EQ(generated()->recordCount(), 1);
+    EXPECT_TRUE(C2Bool(generated()->value("IsAutoGener")));
+    EXPECT_EQ(generated()->value("BasePrice").toDecimal(), pelta::Decimal(11));
+    EXPECT_EQ(C2Str(generated()->value("Measure_ID")), measure("бр"));
+
+    // A new base price changes the generated row instead of adding one.
+    ASSERT_TRUE(prices->MoveToRow("PriceList_ID = '" + base + "'"));
+    prices->editCell("BasePrice", pelta::Variant(pelta::Decimal(20)));
+    ASSERT_TRUE(prices->commitRow());
+    ASSERT_EQ(generated()->recordCount(), 1);
+    EXPECT_EQ(generated()->value("BasePrice").toDecimal(), pelta::Decimal(22));
+    EXPECT_EQ(connection->calls["GetNomItemPlProposal"], 2);
+
+    agent->clear();
+    ASSERT_TRUE(d->FormExtender()->SaveDocument()) << agent->last().text;
+    ASSERT_EQ(generated()->recordCount(), 1) << "saved and read back";
+    EXPECT_EQ(generated()->value("BasePrice").toDecimal(), pelta::Decimal(22));
+}
+
 TEST_F(ItemListsTest, TheLotsAreReadWhenTheirNodeIsShown) {
     auto* d = openItem(firstCode());
     ASSERT_NE(d, nullptr);
