@@ -23,6 +23,18 @@ public:
     virtual bool InitClientSite(IClientSite* Site) = 0;
 };
 
+// The detail form of a nomenclature as other screens open it.
+class IZonNomDetailForm : public virtual pelta::Object {
+public:
+    // The form's form extender.
+    virtual pelta::ObjectRef Form() = 0;
+    virtual bool Init(IClientSite* Site) = 0;
+    // Shows the record `ID` (empty: a new record); False when refused.
+    virtual bool ShowDetail(const std::string& ID) = 0;
+    // Shows the record of the current row of `Rows`.
+    virtual bool ShowFromRecordset(pelta::Ref<pelta::Recordset> Rows) = 0;
+};
+
 // A screen that picks records for another screen.
 class IZonSelector : public virtual pelta::Object {
 public:

@@ -113,6 +113,18 @@ bool cDetailFrame::ShowDetails(const std::string& Key) {
     }
 }
 
+bool cDetailFrame::ShowFromRecordset(RecordsetRef Rows) {
+    try {
+        if (!Rows || Rows->recordCount() == 0 || Rows->bof() || Rows->eof() ||
+            Rows->fieldIndex(m_oDef.KeyField) < 0)
+            return false;
+        return ShowDetails(C2Str(Rows->value(m_oDef.KeyField)));
+    } catch (...) {
+        ShowError("ShowFromRecordset", m_oDef.ObjectName, m_oDef.Caption);
+        return false;
+    }
+}
+
 void cDetailFrame::SetOpener(std::function<void(RecordsetRef)> RowSaved,
                              std::function<void()> RecordDeleted) {
     m_fnRowSaved = std::move(RowSaved);

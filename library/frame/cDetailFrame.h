@@ -17,6 +17,7 @@
 #include "library/contracts/Controls.h"
 #include "library/contracts/Extenders.h"
 #include "library/contracts/IZonTerminate.h"
+#include "library/contracts/Public.h"
 #include "library/frame/Forms.h"
 #include "library/frame/IDetailForm.h"
 
@@ -45,8 +46,17 @@ struct DetailDefinition {
     std::vector<AttribDecl> Attributes;
 };
 
-class cDetailFrame : public LibForm, public IDetailForm, public IZonTerminate {
+class cDetailFrame : public LibForm,
+                     public IDetailForm,
+                     public IZonNomDetailForm,
+                     public IZonTerminate {
 public:
+    // IZonNomDetailForm: how other screens open the form.
+    pelta::ObjectRef Form() override { return pelta::ObjectRef(m_oForm.get()); }
+    bool Init(IClientSite* Site) override { return frInit(Site); }
+    bool ShowDetail(const std::string& ID) override { return ShowDetails(ID); }
+    bool ShowFromRecordset(RecordsetRef Rows) override;
+
     // IDetailForm
     bool frInit(IClientSite* Site) override;
     bool ShowDetails(const std::string& Key) override;

@@ -102,6 +102,13 @@ const std::vector<std::string>& frmItemsDetails::SubLists() {
 
 bool frmItemsDetails::pvInitForm() {
     if (!pvCreateLists()) return false;
+    // The panes keep their sizes with the form's settings.
+    for (const char* setting :
+         {"SplitterAdditional", "SplitterAttrib", "SplitterLists", "SplitterBarCodes"}) {
+        auto splitter = CreateSplitterExtender(this, setting, 0.5);
+        if (!splitter) return false;
+        m_oSplitters.push_back(splitter);
+    }
     m_oAttribExt->Events().ButtonClick = [this](const std::string& Field) {
         try {
             pvPickAttribute(Field);
@@ -490,6 +497,7 @@ void frmItemsDetails::Terminate() {
     m_oCopy.reset();
     if (m_oTreeExt) m_oTreeExt->Events() = {};
     m_oTreeExt.reset();
+    m_oSplitters.clear();
     m_oBound.clear();
     m_oDocs.clear();
     cDetailFrame::Terminate();

@@ -88,6 +88,7 @@ private:
     bool m_bUploaded = false;  // the head holds the controls' values of a save
 
     pelta::Ref<ITreeExtender> m_oTreeExt;
+    std::vector<pelta::Ref<ISplitterExtender>> m_oSplitters;
     std::string m_sNode;                              // the chosen node
     std::string m_sBom;                               // the last bill of materials shown
     std::map<std::string, RecordsetRef> m_oBound;     // grid control → the rows it shows

@@ -491,6 +491,7 @@ void frmItemsDetails::pvPickAttribute(const std::string& Field) {
     const Kind* kind = nullptr;
     for (const Kind& k : kKinds)
         if (Field == k.Field) kind = &k;
+    if (!kind) return;  // items and partners are chosen through their selectors
     std::string caption;
     for (const AttribDecl& a : m_oDef.Attributes)
         if (a.Field == Field) caption = a.Caption;
@@ -503,7 +504,7 @@ void frmItemsDetails::pvPickAttribute(const std::string& Field) {
         return;
     }
     auto centres = Reference("CostCenter");
-    if (!kind || !centres || centres->recordCount() == 0) return;
+    if (!centres || centres->recordCount() == 0) return;
     auto c = centres->clone();
     const std::string quoted = SqlQuote(text);
     const std::string type = "Type = " + std::to_string(kind->Type);

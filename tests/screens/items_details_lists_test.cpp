@@ -4,6 +4,7 @@
 // and the document nodes open the other libraries' lists filtered by the item.
 #include "framework/siblings.h"
 #include "items_details_support.h"
+#include "library/frame/Forms.h"
 
 namespace screentest {
 namespace {
@@ -267,6 +268,33 @@ TEST_F(ItemListsTest, ACostCentreIsChosenByItsCodeAndClearedByNothing) {
     agent->answerInput(pelta::Variant(""));
     attributes->Events().ButtonClick("CcProject_ID");
     EXPECT_TRUE(attributes->Value("CcProject_ID").isNull());
+}
+
+TEST_F(ItemListsTest, AnotherScreenOpensAnItemThroughTheDetailFormInterface) {
+    auto object = CreateRegisteredClass("frmItemsDetails");
+    auto* form = pelta::query<IZonNomDetailForm>(object.get());
+    ASSERT_NE(form, nullptr);
+    ASSERT_TRUE(form->Init(site.get()));
+    auto rows = pelta::makeRef<pelta::Recordset>();
+    rows->appendField("ID", pelta::FieldType::Guid);
+    rows->open();
+    for (const char* code : {"0000003", "0000004"}) {
+        rows->addNew();
+        rows->setValue("ID", pelta::Variant(itemId(code)));
+        rows->update();
+    }
+    rows->moveLast();
+    ASSERT_TRUE(form->ShowFromRecordset(rows));
+    auto* shown = pelta::query<frmItemsDetails>(object.get());
+    EXPECT_EQ(shown->Key(), itemId("0000004"));
+    ASSERT_TRUE(form->ShowDetail(itemId("0000003")));
+    auto* extender = pelta::query<IFormExtender>(form->Form().get());
+    ASSERT_NE(extender, nullptr);
+    EXPECT_EQ(C2Str(extender->ControlValue("txtCode")), "0000003");
+    EXPECT_FALSE(form->ShowDetail("{00000000-0000-4000-8000-0000000000AA}"));
+    EXPECT_EQ(agent->last().text,
+              "Номенклатурата не е намерена или недостатъчни права върху данни");
+    shown->Terminate();
 }
 
 }  // namespace
