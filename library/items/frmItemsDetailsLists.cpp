@@ -388,9 +388,11 @@ void frmItemsDetails::pvBuildTree() {
         m_oGrids[grid]->Bind({});
     m_oBound.clear();
     m_sNode.clear();
-    const std::string chosen =
+    std::string chosen =
         keep.empty() ? C2Str(m_oForm->GetSetting("TreeLists", pelta::Variant(kPriceListNode)))
                      : keep;
+    // The placeholder of a new bill asks for a name: never chosen by itself.
+    if (chosen == kNewBomNode) chosen = kBomsNode;
     if (!m_oTreeExt->SelectNode(chosen)) m_oTreeExt->SelectNode(kPriceListNode);
 }
 

@@ -104,8 +104,13 @@ TEST_F(ItemListsTest, BillsOfMaterialsAreNodesOfTheirOwnAndAreSavedWithTheItem) 
               (std::vector<std::string>{"(Нова рецепта)", "Рецепта Основна", "Рецепта Резервна"}));
     EXPECT_TRUE(rows->Rows()) << "the new bill shows its (empty) rows";
 
+    // The placeholder given up on leaves no bill and is not asked again.
+    agent->cancelInput("Име на рецепта:");
+    ASSERT_TRUE(tree(d)->SelectNode(frmItemsDetails::kNewBomNode));
     agent->clear();
     ASSERT_TRUE(d->FormExtender()->SaveDocument()) << agent->last().text;
+    EXPECT_EQ(agent->pending(), 0u);
+    EXPECT_EQ(tree(d)->SelectedKey(), "Производство и придобиване");
     EXPECT_EQ(liveRows(d->Rows("Boms")), 2);
     ASSERT_EQ(liveRows(d->Rows("BomsDetails")), 1);
     EXPECT_EQ(bomNode(d, "Основна"), main) << "the saved bills keep their keys";
