@@ -1,6 +1,7 @@
 // The item editor's barcode preview: the barcode of the chosen row of the
 // barcodes grid drawn with the options beside it, and saved as a Windows
 // metafile (10006).
+#include <filesystem>
 #include <fstream>
 #include <string_view>
 
@@ -11,7 +12,6 @@
 #include "library/frame/mdGlobals.h"
 #include "library/items/frmItemsDetails.h"
 #include "library/items/mdBarcodeImage.h"
-#include "platform/automation/error.h"
 #include "platform/data/recordset.h"
 
 namespace PeltaNom15 {
@@ -174,10 +174,9 @@ void frmItemsDetails::pvSaveBarCode() {
         m_oForm->MsgBox(Printf("Файлът '%1' не може да бъде записан.", path), vbExclamation);
         return;
     }
-    const size_t slash = path.find_last_of('/');
-    if (slash != std::string::npos)
-        m_oForm->SaveSetting("InitialDir",
-                             pelta::Variant(slash == 0 ? std::string("/") : path.substr(0, slash)));
+    const std::filesystem::path folderChosen = std::filesystem::path(path).parent_path();
+    if (!folderChosen.empty())
+        m_oForm->SaveSetting("InitialDir", pelta::Variant(folderChosen.string()));
 }
 
 }  // namespace PeltaNom15
