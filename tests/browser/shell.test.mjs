@@ -9,7 +9,8 @@
 //    say so), the currency-rate list and its detail form over the real
 //    framework and service — a rate entered, saved and found in the list,
 //    Yes/No questions answered, an item's barcode preview following the
-//    chosen barcode row, and a closed tab's screens terminated; and
+//    chosen barcode row and saved as a download, and a closed tab's screens
+//    terminated; and
 //    the partners' list and editor — a partner found with the quick filter,
 //    opened, changed and saved, a new one refused once and then saved;
 //  * the shell over its fixture screens (shell_fixture_server): a list of a
@@ -19,7 +20,7 @@
 import { after, before, describe, test } from 'node:test';
 import assert from 'node:assert/strict';
 import { spawn } from 'node:child_process';
-import { mkdtempSync, mkdirSync, rmSync } from 'node:fs';
+import { mkdtempSync, mkdirSync, readFileSync, rmSync } from 'node:fs';
 import { tmpdir } from 'node:os';
 import path from 'node:path';
 import { fileURLToPath } from 'node:url';
@@ -284,7 +285,7 @@ describe('pelta serve', () => {
     await search.press('Enter');
   });
 
-  test('choosing a barcode row shows its image in the preview', async () => {
+  test('choosing a barcode row shows its image in the preview, which is saved as a download', async () => {
     const items = page.locator('section.screen[data-kind=list]:not([hidden])');
     await page.locator('.tab', { hasText: 'Продукти и материали' }).click();
     const search = items.locator('.quick-filter input[name=filter-802]');
@@ -311,6 +312,15 @@ describe('pelta serve', () => {
     assert.equal(await code.inputValue(), second);
     assert.notEqual(await preview.getAttribute('src'), first);
     await page.screenshot({ path: path.join(shotDir, 'pelta-item-barcode.png'), fullPage: true });
+
+    // Saved as a metafile: the browser receives it as a download.
+    const [saved] = await Promise.all([
+      page.waitForEvent('download'),
+      detail.locator('button[data-command="10006"]').click(),
+    ]);
+    assert.equal(saved.suggestedFilename(), `${second}.wmf`);
+    const bytes = readFileSync(await saved.path());
+    assert.equal(bytes.readUInt32LE(0), 0x9ac6cdd7, 'a placeable metafile');
 
     await page.locator('.tab', { hasText: 'Продукти и материали' }).click();
     await search.fill('');
