@@ -381,6 +381,21 @@ bool FormExtender::InputList(const std::string& Title, const std::string& Prompt
     return true;
 }
 
+bool FormExtender::SaveFileDialog(const std::string& Title, const std::string& Filter,
+                                  const std::string& InitialDir, std::string& FileName) {
+    fw::Prompt p;
+    p.kind = PromptKind::SaveFile;
+    p.caption = caption_;
+    p.title = Title;
+    p.filter = Filter;
+    p.initialDir = InitialDir;
+    p.fileName = FileName;
+    auto answer = requireAgent(Title)->saveFile(p);
+    if (!answer || answer->empty()) return false;
+    FileName = answer->string();
+    return true;
+}
+
 // ---- settings -----------------------------------------------------------------------
 
 pelta::Variant FormExtender::GetSetting(const std::string& Name, const pelta::Variant& Default) {

@@ -102,6 +102,9 @@ public:
     // a choice's number or text (anything else raises InvalidProcedureCall).
     bool InputList(const std::string& Title, const std::string& Prompt,
                    const std::vector<std::string>& Choices, int32_t& Choice) override;
+    // Asks the user agent (PromptKind::SaveFile); the answer is a path.
+    bool SaveFileDialog(const std::string& Title, const std::string& Filter,
+                        const std::string& InitialDir, std::string& FileName) override;
 
     // Kept under the layout key (the object name while no key is set).
     pelta::Variant GetSetting(const std::string& Name, const pelta::Variant& Default) override;

@@ -58,6 +58,19 @@ ScriptedUserAgent& ScriptedUserAgent::cancelInput(std::string expectText) {
     return *this;
 }
 
+ScriptedUserAgent& ScriptedUserAgent::answerSaveFile(std::filesystem::path path,
+                                                     std::string expectTitle) {
+    std::lock_guard lock(mutex_);
+    saveAnswers_.push_back(SaveAnswer{std::move(path), std::move(expectTitle)});
+    return *this;
+}
+
+ScriptedUserAgent& ScriptedUserAgent::cancelSaveFile(std::string expectTitle) {
+    std::lock_guard lock(mutex_);
+    saveAnswers_.push_back(SaveAnswer{std::nullopt, std::move(expectTitle)});
+    return *this;
+}
+
 ScriptedUserAgent::Answer ScriptedUserAgent::takeAnswer(const Prompt& prompt, bool input) {
     // Called with the mutex held; the prompt is already recorded.
     auto refuse = [&](const std::string& why) -> Answer {
@@ -98,6 +111,21 @@ std::optional<pelta::Variant> ScriptedUserAgent::inputBox(const Prompt& prompt) 
     return takeAnswer(prompt, true).value;
 }
 
+std::optional<std::filesystem::path> ScriptedUserAgent::saveFile(const Prompt& prompt) {
+    std::lock_guard lock(mutex_);
+    prompts_.push_back(prompt);
+    auto refuse = [&](const std::string& why) {
+        unscripted_.push_back(prompt);
+        throw UnscriptedPrompt(why + " save-file dialog \"" + prompt.title + "\"");
+    };
+    if (saveAnswers_.empty()) refuse("No answer was scripted for the");
+    SaveAnswer a = saveAnswers_.front();
+    if (!a.expectTitle.empty() && prompt.title != a.expectTitle)
+        refuse("The scripted answer expected the title \"" + a.expectTitle + "\", not the");
+    saveAnswers_.pop_front();
+    return a.path;
+}
+
 std::vector<Prompt> ScriptedUserAgent::prompts() const {
     std::lock_guard lock(mutex_);
     return prompts_;
@@ -119,7 +147,7 @@ Prompt ScriptedUserAgent::last() const {
 
 size_t ScriptedUserAgent::pending() const {
     std::lock_guard lock(mutex_);
-    return answers_.size();
+    return answers_.size() + saveAnswers_.size();
 }
 
 std::vector<Prompt> ScriptedUserAgent::unscripted() const {
@@ -130,6 +158,7 @@ std::vector<Prompt> ScriptedUserAgent::unscripted() const {
 void ScriptedUserAgent::clear() {
     std::lock_guard lock(mutex_);
     answers_.clear();
+    saveAnswers_.clear();
     prompts_.clear();
     unscripted_.clear();
 }

@@ -9,6 +9,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <deque>
+#include <filesystem>
 #include <mutex>
 #include <optional>
 #include <stdexcept>
@@ -24,6 +25,7 @@ enum class PromptKind {
     MessageBox,  // text, style, caption, details; answers a button
     Anchored,    // a message shown at a control, with title and hint
     InputBox,    // prompt and title; answers a value or cancel
+    SaveFile,    // a save-file dialog; answers a path or cancel
 };
 
 struct Prompt {
@@ -36,6 +38,11 @@ struct Prompt {
     std::string title;     // anchored messages and input boxes
     std::string hint;      // anchored messages
     pelta::Variant value;  // input boxes: the default offered
+    // Save-file dialogs (with `title`): the filter ("Описание|*.ext|..."),
+    // the folder offered first and the file name offered.
+    std::string filter;
+    std::string initialDir;
+    std::string fileName;
 };
 
 // The buttons a message-box style offers (vbOK, vbYes ...), in order.
@@ -53,6 +60,12 @@ public:
     virtual void anchoredMessage(const Prompt& prompt) = 0;
     // Asks for a value; nullopt when cancelled.
     virtual std::optional<pelta::Variant> inputBox(const Prompt& prompt) = 0;
+    // Asks where to save a file the screen will write; nullopt when
+    // cancelled. The default cancels: an agent that cannot save files.
+    virtual std::optional<std::filesystem::path> saveFile(const Prompt& prompt) {
+        (void)prompt;
+        return std::nullopt;
+    }
     // A form has shown a document (a detail form opened by its list, or
     // moved to another record): a host with windows brings it forward. The
     // default does nothing, as a test needs nothing shown.
@@ -81,10 +94,16 @@ public:
     // The next input box is answered with `value` (or cancelled).
     ScriptedUserAgent& answerInput(pelta::Variant value, std::string expectText = {});
     ScriptedUserAgent& cancelInput(std::string expectText = {});
+    // The next save-file dialog is answered with `path` (or cancelled); when
+    // `expectTitle` is given the dialog's title must be it. Save-file
+    // answers have their own queue.
+    ScriptedUserAgent& answerSaveFile(std::filesystem::path path, std::string expectTitle = {});
+    ScriptedUserAgent& cancelSaveFile(std::string expectTitle = {});
 
     int32_t messageBox(const Prompt& prompt) override;
     void anchoredMessage(const Prompt& prompt) override;
     std::optional<pelta::Variant> inputBox(const Prompt& prompt) override;
+    std::optional<std::filesystem::path> saveFile(const Prompt& prompt) override;
 
     // Everything shown, in order.
     std::vector<Prompt> prompts() const;
@@ -92,7 +111,7 @@ public:
     std::vector<std::string> texts() const;
     // The last prompt; throws when nothing was shown.
     Prompt last() const;
-    size_t pending() const;  // scripted answers not used yet
+    size_t pending() const;  // scripted answers not used yet (save-file ones included)
     std::vector<Prompt> unscripted() const;
     void clear();  // forgets prompts and answers
 
@@ -107,6 +126,11 @@ private:
 
     mutable std::mutex mutex_;
     std::deque<Answer> answers_;
+    struct SaveAnswer {
+        std::optional<std::filesystem::path> path;
+        std::string expectTitle;
+    };
+    std::deque<SaveAnswer> saveAnswers_;
     std::vector<Prompt> prompts_;
     std::vector<Prompt> unscripted_;
 };

@@ -8,6 +8,7 @@ packages=(
   libicu-dev libsqlite3-dev libunwind-dev
   libgtest-dev libgmock-dev libbenchmark-dev
   libcpp-httplib-dev nlohmann-json3-dev
+  libzint-dev
 )
 # Extra groups: "fuzz" adds clang with its sanitizer runtimes; "browser" adds
 # Node.js with npm (for the shell's front end and its browser test) and the

@@ -10,6 +10,7 @@
 
 #include "library/contracts/Constants.h"
 #include "platform/automation/error.h"
+#include "shell/downloads.h"
 #include "shell/log.h"
 #include "shell/session.h"
 #include "shell/variant_json.h"
@@ -379,6 +380,19 @@ ApiResponse Api::route(const ApiRequest& r) {
         }
     }
 
+    if (what == "downloads") {
+        if (p.size() != 3) throw ApiError(404, "No such resource");
+        if (m != "GET") throw ApiError(405, "Method not allowed");
+        // Tokens are the shell's own 128 random bits; nothing else names a file.
+        if (!wellFormedSessionId(p[2])) throw ApiError(404, "No such download");
+        auto file = s.downloads()->take(p[2]);
+        if (!file) throw ApiError(404, "No such download");
+        ApiResponse resp{200, std::move(file->bytes), {}};
+        resp.contentType = "application/octet-stream";
+        resp.disposition = attachmentDisposition(file->name);
+        return resp;
+    }
+
     if (what == "navigation" && p.size() == 2) {
         if (m != "GET") throw ApiError(405, "Method not allowed");
         json lists = json::array();
@@ -602,6 +616,16 @@ ApiResponse Api::route(const ApiRequest& r) {
                              [&](const TreeNodeInfo& n) { return n.key == key; }))
                 throw ApiError(400, "Unknown node");
             return json{{"ok", screen->activateNode(tree->name, key)}};
+        }));
+    }
+    if (action == "current") {
+        std::string gridName = stringField(body, "grid", true);
+        std::string row = stringField(body, "row", true);
+        return ok(s.ui().call([&] {
+            auto screen = needScreen();
+            GridInfo grid = findGrid(*screen, gridName);
+            if (!grid.editable) throw ApiError(400, "The grid cannot be edited");
+            return json{{"ok", screen->chooseRow(grid.name, row)}};
         }));
     }
     if (action == "execute") {

@@ -19,8 +19,11 @@
 //   POST   /api/screens/N/attributebutton {grid?, field}  a selector row's button
 //   POST   /api/screens/N/attributeselect {grid?, field}  the chosen attribute row
 //   POST   /api/screens/N/activate {tree?, key}   a tree node clicked
+//   POST   /api/screens/N/current {grid, row}  the row the person stands on
 //   DELETE /api/screens/N      ?force=1        closes the screen
 //   POST   /api/dialog/N       {button, value?} answers a waiting dialog
+//   GET    /api/downloads/T                    a file a screen wrote (once; see
+//                                              the "download" event)
 //
 // The session travels in the X-Pelta-Session header, the "session" query
 // parameter (event streams and beacons) or the pelta_session cookie. Errors
@@ -49,6 +52,9 @@ struct ApiResponse {
     int status = 200;
     std::string body;
     std::string setCookie;  // a Set-Cookie value, when the session changes
+    // A body that is not JSON (a download): its type and disposition.
+    std::string contentType = {};
+    std::string disposition = {};
 };
 
 struct ApiOptions {

@@ -24,6 +24,7 @@
 #include "platform/automation/ascii.h"
 #include "platform/automation/error.h"
 #include "platform/data/recordset.h"
+#include "shell/downloads.h"
 #include "shell/user_agent.h"
 
 namespace pelta::shell {
@@ -97,6 +98,8 @@ const char* controlKind(ControlKind k) {
             return "rich";
         case ControlKind::Button:
             return "button";
+        case ControlKind::Picture:
+            return "picture";
     }
     return "text";
 }
@@ -560,6 +563,18 @@ public:
         a->Select(field);
     }
 
+    bool chooseRow(const std::string& grid, const std::string& row) override {
+        fw::GridExtender& g = gridNamed(grid);
+        Variant bm = rowBookmark(row);
+        if (bm.isEmpty()) refuse("Bad row key " + row);
+        if (g.CurrentBookmark() == bm) return true;
+        // Leaving the row being edited ends its edit, which may be refused.
+        if (!g.commitRow()) return false;
+        if (!g.SetCurrentBookmark(bm)) refuse("The row " + row + " is not in the grid");
+        invalidate();
+        return true;
+    }
+
     bool activateNode(const std::string& tree, const std::string& key) override {
         if (!owner_) refuse("The form is closed");
         for (fw::TreeExtender* t : fw::services()->treesOfOwner(owner_.get())) {
@@ -618,6 +633,9 @@ public:
             return std::nullopt;
         return Variant(value);
     }
+    // A file the screen writes for the person: a path of the session's
+    // downloads, offered to the page when the action ends.
+    std::optional<std::filesystem::path> saveFile(const fw::Prompt& p) override;
     void documentShown(fw::FormExtender& form) override;
 
     void detach() noexcept { session_ = nullptr; }
@@ -680,8 +698,16 @@ public:
         host_.openScreen(screen);
     }
 
-    // After a command or a save: closed documents leave, the rest is redrawn.
+    std::optional<std::filesystem::path> saveFile(const fw::Prompt& p) {
+        Downloads* downloads = host_.downloads();
+        if (!downloads) return std::nullopt;
+        return downloads->reserve(p.fileName);
+    }
+
+    // After a command or a save: files written go to the page, closed
+    // documents leave, the rest is redrawn.
     void afterAction() {
+        if (Downloads* downloads = host_.downloads()) downloads->offer();
         prune();
         auto details = details_;
         for (auto& weak : details) {
@@ -738,6 +764,11 @@ private:
     std::vector<std::weak_ptr<ListScreen>> lists_;
     std::vector<std::weak_ptr<DetailScreen>> details_;
 };
+
+std::optional<std::filesystem::path> WebAgent::saveFile(const fw::Prompt& p) {
+    if (!session_) return std::nullopt;
+    return session_->saveFile(p);
+}
 
 void WebAgent::documentShown(fw::FormExtender& form) {
     if (session_) session_->documentShown(form);

@@ -78,7 +78,8 @@ struct HttpServer::Impl {
         res.status = a.status;
         if (!a.setCookie.empty()) res.set_header("Set-Cookie", a.setCookie);
         res.set_header("Cache-Control", "no-store");
-        res.set_content(a.body, kJson);
+        if (!a.disposition.empty()) res.set_header("Content-Disposition", a.disposition);
+        res.set_content(a.body, a.contentType.empty() ? kJson : a.contentType.c_str());
     }
 
     void events(const httplib::Request& req, httplib::Response& res) {

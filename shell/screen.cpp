@@ -48,6 +48,10 @@ void Screen::selectAttribute(const std::string& grid, const std::string&) {
     noAttributes(grid);
 }
 
+bool Screen::chooseRow(const std::string& grid, const std::string&) {
+    notEditable(grid);
+}
+
 bool Screen::activateNode(const std::string& tree, const std::string&) {
     pelta::raise(pelta::errc::InvalidProcedureCall, "No tree " + tree, "pelta.shell");
 }

@@ -17,6 +17,7 @@
 namespace pelta::shell {
 
 class UserAgent;
+class Downloads;
 
 struct ColumnInfo {
     std::string key;
@@ -208,6 +209,10 @@ public:
     virtual void selectAttribute(const std::string& grid, const std::string& field);
     // The person clicked a node of a tree; false when the tree has no such node.
     virtual bool activateNode(const std::string& tree, const std::string& key);
+    // The person stands on the row `row` of an editable grid: leaving the row
+    // being edited ends its edit (false when that is refused). The default
+    // raises: a screen without such grids.
+    virtual bool chooseRow(const std::string& grid, const std::string& row);
 
     // The termination protocol: may refuse (unsaved edits the person keeps).
     virtual bool queryTerminate() = 0;
@@ -220,6 +225,9 @@ class ScreenHost {
 public:
     virtual ~ScreenHost() = default;
     virtual UserAgent& userAgent() = 0;
+    // Where files a screen writes for the person go (downloads of the page);
+    // null when the host cannot hand files over.
+    virtual Downloads* downloads() { return nullptr; }
     // The login name of the person; empty when nobody logged in (loopback).
     virtual std::string userName() const { return {}; }
     // Shows another screen (a detail form opened by a list); answers its id.

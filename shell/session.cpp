@@ -51,6 +51,7 @@ Session::Session(std::string id, ScreenProvider& provider, std::string user)
       user_(std::move(user)),
       provider_(provider),
       dialogs_(events_),
+      downloads_(events_),
       lastActivity_(ticks(Clock::now())) {
     ui_.call([this] { library_ = provider_.startSession(*this); });
 }

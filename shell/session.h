@@ -17,6 +17,7 @@
 #include <vector>
 
 #include "shell/dialog_broker.h"
+#include "shell/downloads.h"
 #include "shell/event_channel.h"
 #include "shell/screen.h"
 #include "shell/ui_thread.h"
@@ -46,6 +47,7 @@ public:
 
     // ScreenHost
     UserAgent& userAgent() override { return dialogs_; }
+    Downloads* downloads() override { return &downloads_; }
     std::string userName() const override { return user_; }
     int64_t openScreen(std::shared_ptr<Screen> screen) override;
     void screenChanged(Screen& screen) override;
@@ -72,6 +74,7 @@ private:
     ScreenProvider& provider_;
     EventChannel events_;
     DialogBroker dialogs_;
+    Downloads downloads_;
     std::atomic<int64_t> lastActivity_;
     std::atomic<bool> released_{false};
     std::mutex releaseMutex_;

@@ -22,6 +22,7 @@ enum class ControlKind {
     Note,  // multi-line plain text
     RichText,
     Button,
+    Picture,  // an image; its value is an SVG document (empty: none)
 };
 
 struct ControlDecl {

@@ -120,6 +120,16 @@ public:
     // False when cancelled.
     virtual bool InputList(const std::string& Title, const std::string& Prompt,
                            const std::vector<std::string>& Choices, int32_t& Choice) = 0;
+    // A save-file dialog titled `Title`: `Filter` lists descriptions and their
+    // patterns joined by "|" ("Текст|*.txt|Всички файлове (*.*)|*.*"),
+    // `InitialDir` is the folder offered first, `FileName` carries the name
+    // offered in and the chosen file's path out. False when cancelled, and
+    // from a host that cannot save files.
+    virtual bool SaveFileDialog(const std::string& Title, const std::string& Filter,
+                                const std::string& InitialDir, std::string& FileName) {
+        (void)Title, (void)Filter, (void)InitialDir, (void)FileName;
+        return false;
+    }
 
     // Settings under the screen's layout key.
     virtual pelta::Variant GetSetting(const std::string& Name, const pelta::Variant& Default) = 0;

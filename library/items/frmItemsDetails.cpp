@@ -17,8 +17,10 @@
 
 namespace PeltaNom15 {
 
-// The tree of lists and its grids (frmItemsDetailsLists.cpp).
+// The tree of lists and its grids (frmItemsDetailsLists.cpp), the barcode
+// preview (frmItemsDetailsBarcode.cpp).
 std::vector<ControlDecl> ItemListControls();
+std::vector<ControlDecl> ItemBarcodeControls();
 
 namespace {
 
@@ -57,6 +59,8 @@ DetailDefinition ItemsDetails() {
         Control("rchNoteRtf", ControlKind::RichText, " Забележка", "NoteRtf", "Общи"),
     };
     for (ControlDecl& c : ItemListControls())
+        d.Controls.push_back(std::move(c));
+    for (ControlDecl& c : ItemBarcodeControls())
         d.Controls.push_back(std::move(c));
     d.AttribGrid = kAttribGrid;
     d.AttribGroups = kItemAttribGroups;
@@ -101,7 +105,7 @@ const std::vector<std::string>& frmItemsDetails::SubLists() {
 }
 
 bool frmItemsDetails::pvInitForm() {
-    if (!pvCreateLists()) return false;
+    if (!pvCreateLists() || !pvCreateBarCodePreview()) return false;
     // The panes keep their sizes with the form's settings.
     for (const char* setting :
          {"SplitterAdditional", "SplitterAttrib", "SplitterLists", "SplitterBarCodes"}) {
@@ -467,6 +471,10 @@ frmItemsDetails::SaveRefusal frmItemsDetails::pvSaveRefused(pelta::PropertyBag& 
 
 bool frmItemsDetails::pvExecute(int32_t CommandID) {
     if (CommandID == kCmdCopy) return pvCopy();
+    if (CommandID == kCmdSaveBarCode) {
+        pvSaveBarCode();
+        return true;
+    }
     return pvBomCommand(CommandID);
 }
 
@@ -500,6 +508,7 @@ void frmItemsDetails::Terminate() {
     m_oSplitters.clear();
     m_oBound.clear();
     m_oDocs.clear();
+    m_oBarCodeFields.clear();
     cDetailFrame::Terminate();
 }
 

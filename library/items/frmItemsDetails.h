@@ -13,6 +13,8 @@
 
 namespace PeltaNom15 {
 
+struct BarcodeImage;
+
 class frmItemsDetails final : public cDetailFrame {
 public:
     frmItemsDetails();
@@ -29,6 +31,8 @@ public:
     // new bill.
     ITreeExtender* Tree() const { return m_oTreeExt.get(); }
     static constexpr const char* kNewBomNode = "__empty__Bom";
+    // Saves the previewed barcode as a Windows metafile.
+    static constexpr int32_t kCmdSaveBarCode = 10006;
     // The list control of another library opened by a document node.
     pelta::ObjectRef DocumentList(const std::string& NodeKey) const;
 
@@ -67,6 +71,14 @@ private:
     void pvPriceWithVat(IGridExtender& Grid, const std::string& Column);
     void pvPickAttribute(const std::string& Field);
 
+    // the barcode preview (frmItemsDetailsBarcode.cpp)
+    bool pvCreateBarCodePreview();
+    void pvBarCodeRow();
+    void pvDrawBarCode();
+    BarcodeImage pvBarCodeImage(bool Metafile);
+    void pvEnableBarCodeCommand();
+    void pvSaveBarCode();
+
     // bills of materials (frmItemsDetailsBoms.cpp)
     std::string pvBomOfNode(const std::string& Key) const;
     void pvBomNodes();
@@ -89,10 +101,11 @@ private:
 
     pelta::Ref<ITreeExtender> m_oTreeExt;
     std::vector<pelta::Ref<ISplitterExtender>> m_oSplitters;
-    std::string m_sNode;                              // the chosen node
-    std::string m_sBom;                               // the last bill of materials shown
-    std::map<std::string, RecordsetRef> m_oBound;     // grid control → the rows it shows
-    std::map<std::string, pelta::ObjectRef> m_oDocs;  // document node → list control
+    std::string m_sNode;                                       // the chosen node
+    std::string m_sBom;                                        // the last bill of materials shown
+    std::map<std::string, RecordsetRef> m_oBound;              // grid control → the rows it shows
+    std::map<std::string, pelta::ObjectRef> m_oDocs;           // document node → list control
+    std::vector<pelta::Ref<IFieldExtender>> m_oBarCodeFields;  // the preview's options
 };
 
 }  // namespace PeltaNom15

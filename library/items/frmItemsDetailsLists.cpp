@@ -220,7 +220,9 @@ std::vector<cDetailFrame::GridDecl> ListGrids() {
     };
 }
 
-// Fixed lists of grid cells: "value|text|value|text...".
+}  // namespace
+
+// Fixed lists of grid cells and combos: "value|text|value|text...".
 RecordsetRef FixedRows(std::string_view Values) {
     auto rs = pelta::makeRef<pelta::Recordset>();
     rs->appendField("ID", pelta::FieldType::Long);
@@ -240,8 +242,6 @@ RecordsetRef FixedRows(std::string_view Values) {
     rs->updateBatch();
     return rs;
 }
-
-}  // namespace
 
 // Grid controls sit in the group of their node, so that a host shows the
 // grid of the chosen node.
@@ -401,6 +401,7 @@ void frmItemsDetails::pvNodeActivate(const std::string& Key) {
         m_sNode = Key;
         m_oForm->SaveSetting("TreeLists", pelta::Variant(Key));
         pvEnableBomCommands();
+        pvEnableBarCodeCommand();
         if (Key == kNewBomNode) {
             pvNewBom();
             return;
@@ -420,6 +421,8 @@ void frmItemsDetails::pvNodeActivate(const std::string& Key) {
                 m_oGrids[node->Grid]->Bind(rows);
                 m_oBound[node->Grid] = rows;
             }
+            // The preview shows the barcode of the row the grid stands on.
+            if (std::string_view(node->Grid) == "geBarCodes") pvBarCodeRow();
             return;
         }
         pvOpenDocuments(Key);

@@ -8,7 +8,9 @@
 //    the library's lists as navigation (those the library cannot make yet
 //    say so), the currency-rate list and its detail form over the real
 //    framework and service — a rate entered, saved and found in the list,
-//    Yes/No questions answered, and a closed tab's screens terminated; and
+//    Yes/No questions answered, an item's barcode preview following the
+//    chosen barcode row and saved as a download, and a closed tab's screens
+//    terminated; and
 //    the partners' list and editor — a partner found with the quick filter,
 //    opened, changed and saved, a new one refused once and then saved;
 //  * the shell over its fixture screens (shell_fixture_server): a list of a
@@ -18,7 +20,7 @@
 import { after, before, describe, test } from 'node:test';
 import assert from 'node:assert/strict';
 import { spawn } from 'node:child_process';
-import { mkdtempSync, mkdirSync, rmSync } from 'node:fs';
+import { mkdtempSync, mkdirSync, readFileSync, rmSync } from 'node:fs';
 import { tmpdir } from 'node:os';
 import path from 'node:path';
 import { fileURLToPath } from 'node:url';
@@ -247,8 +249,10 @@ describe('pelta serve', () => {
     await items.locator('.ag-row').first().click();
     await page.keyboard.press('Control+n');
     const detail = page.locator('section.screen[data-kind=detail]:not([hidden])');
-    await detail.locator('[data-control=txtCode]').waitFor();
-    assert.equal(await detail.locator('[data-control=txtCode]').inputValue(), '');
+    const txtCode = detail.locator('[data-control=txtCode]');
+    // The form shown for the last item is drawn anew for the new one.
+    for (let i = 0; i < 100 && (await txtCode.inputValue()) !== ''; i++) await page.waitForTimeout(50);
+    assert.equal(await txtCode.inputValue(), '');
     // The defaults of a new product: VAT group "Б" among the attributes.
     assert.equal(await detail.locator('select[name=TaxGroup] option:checked').textContent(), 'Б');
     await commitAttribute('Name2', 'Second name');
@@ -277,6 +281,48 @@ describe('pelta serve', () => {
     await search.press('Enter');
     await items.locator('.footer', { hasText: /Записи: 1$/ }).waitFor();
     await items.locator('.ag-row', { hasText: 'Браузърен продукт' }).waitFor();
+    await search.fill('');
+    await search.press('Enter');
+  });
+
+  test('choosing a barcode row shows its image in the preview, which is saved as a download', async () => {
+    const items = page.locator('section.screen[data-kind=list]:not([hidden])');
+    await page.locator('.tab', { hasText: 'Продукти и материали' }).click();
+    const search = items.locator('.quick-filter input[name=filter-802]');
+    await search.fill('/0000007');
+    await search.press('Enter');
+    await items.locator('.footer', { hasText: /Записи: 1$/ }).waitFor();
+    await items.locator('.ag-row[row-index="0"]').dblclick();
+    const detail = page.locator('section.screen[data-kind=detail]:not([hidden])');
+    const txtCode = detail.locator('[data-control=txtCode]');
+    for (let i = 0; i < 100 && (await txtCode.inputValue()) !== '0000007'; i++) await page.waitForTimeout(50);
+    await detail.locator('nav.form-tree button[data-node="Баркодове"]').click();
+    const preview = detail.locator('img[data-control=imgBarCode]');
+    await preview.waitFor();
+    const first = await preview.getAttribute('src');
+    assert.match(first, /^data:image\/svg\+xml/);
+    assert.ok((await preview.evaluate((img) => img.complete && img.naturalWidth)) > 0, 'the image is drawn');
+
+    // Another row: the options and the image follow it.
+    const rows = detail.locator('.grid[data-grid=geBarCodes] tbody tr');
+    const second = await rows.nth(1).locator('input[name=Code]').inputValue();
+    await rows.nth(1).locator('input[name=Note]').click();
+    const code = detail.locator('input[data-control=txtBarCode]');
+    for (let i = 0; i < 100 && (await code.inputValue()) !== second; i++) await page.waitForTimeout(50);
+    assert.equal(await code.inputValue(), second);
+    assert.notEqual(await preview.getAttribute('src'), first);
+    await page.screenshot({ path: path.join(shotDir, 'pelta-item-barcode.png'), fullPage: true });
+
+    // Saved as a metafile: the browser receives it as a download.
+    const [saved] = await Promise.all([
+      page.waitForEvent('download'),
+      detail.locator('button[data-command="10006"]').click(),
+    ]);
+    assert.equal(saved.suggestedFilename(), `${second}.wmf`);
+    const bytes = readFileSync(await saved.path());
+    assert.equal(bytes.readUInt32LE(0), 0x9ac6cdd7, 'a placeable metafile');
+
+    await page.locator('.tab', { hasText: 'Продукти и материали' }).click();
     await search.fill('');
     await search.press('Enter');
   });

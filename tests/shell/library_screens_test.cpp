@@ -465,3 +465,65 @@ TEST_F(LibraryScreensTest, ANewPartnerIsCheckedSavedAndShownInTheList) {
 
 }  // namespace
 }  // namespace pelta::shell
+
+namespace pelta::shell {
+namespace {
+
+// The item editor's barcode preview as the page drives it: the preview is an
+// SVG value of its control, the row the person stands on is drawn, and the
+// saved metafile reaches the page as a download.
+TEST_F(LibraryScreensTest, TheItemsBarcodePreviewFollowsTheChosenRowAndIsSavedAsADownload) {
+    json opened = ok("POST", "/api/lists", R"({"id":"PeltaNom15.ctxItems"})");
+    int64_t list = opened["id"];
+    std::string key = ok("GET", path(list, "rows"), {}, {{"count", "1"}})["rows"][0]["key"];
+    int64_t detail = showing(list, {{"command", 102}, {"current", key}});
+    ASSERT_EQ(
+        ok("POST", path(detail, "activate"), R"({"tree":"trvLists","key":"Баркодове"})")["ok"],
+        true);
+
+    json d = ok("GET", path(detail));
+    const json& picture = control(d, "imgBarCode");
+    EXPECT_EQ(picture["kind"], "picture");
+    EXPECT_EQ(picture["group"], "Баркодове");
+    EXPECT_TRUE(picture["readOnly"]);
+    ASSERT_TRUE(picture["value"].is_string());
+    EXPECT_EQ(picture["value"].get<std::string>().rfind("<svg", 0), 0u);
+    EXPECT_EQ(call("POST", path(detail, "values"),
+                   R"({"control":"imgBarCode","value":"<svg onload=\"x\"/>"})")
+                  .status,
+              400)
+        << "the page never sets the picture";
+
+    json rows = ok("GET", path(detail, "rows"), {}, {{"grid", "geBarCodes"}});
+    ASSERT_EQ(rows["total"], 2);
+    size_t codeColumn = 0;
+    for (const json& g : d["grids"])
+        if (g["name"] == "geBarCodes")
+            for (size_t i = 0; i < g["columns"].size(); ++i)
+                if (g["columns"][i]["key"] == "Code") codeColumn = i;
+    const json& second = rows["rows"][1];
+    EXPECT_EQ(ok("POST", path(detail, "current"),
+                 json{{"grid", "geBarCodes"}, {"row", second["key"]}}.dump())["ok"],
+              true);
+    d = ok("GET", path(detail));
+    const std::string code = second["cells"][codeColumn];
+    EXPECT_EQ(control(d, "txtBarCode")["value"], code);
+    EXPECT_NE(control(d, "imgBarCode")["value"].get<std::string>().find(code.substr(1, 6)),
+              std::string::npos);
+    EXPECT_EQ(
+        call("POST", path(detail, "current"), R"({"grid":"geBarCodes","row":"999999"})").status,
+        422);
+    EXPECT_EQ(call("POST", path(detail, "current"), R"({"grid":"geNone","row":"1"})").status, 400);
+
+    uint64_t after = live().events().lastSequence();
+    EXPECT_EQ(ok("POST", path(detail, "execute"), R"({"command":10006})")["handled"], true);
+    json offered = nextEvent(live().events(), "download", after);
+    EXPECT_EQ(offered["name"], code + ".wmf");
+    ApiResponse file = call("GET", "/api/downloads/" + offered["token"].get<std::string>());
+    ASSERT_EQ(file.status, 200);
+    EXPECT_EQ(file.body.substr(0, 4), std::string("\xD7\xCD\xC6\x9A", 4));
+    EXPECT_NE(file.disposition.find(code + ".wmf"), std::string::npos);
+}
+
+}  // namespace
+}  // namespace pelta::shell

@@ -41,6 +41,11 @@ function inputFor(control) {
       el = document.createElement('span');
       el.textContent = control.value ?? '';
       return el;
+    case 'picture':
+      el = document.createElement('img');
+      el.alt = control.caption || '';
+      setPicture(el, control.value);
+      return el;
     default:
       el = document.createElement('input');
       el.type = 'text';
@@ -53,7 +58,18 @@ function inputFor(control) {
   return el;
 }
 
-function valueOf(el, control) {
+// A picture's value is an SVG document, shown as an image from a data: URL,
+// where it can run nothing and load nothing; anything else shows no image.
+export function setPicture(img, value) {
+  const svg = typeof value === 'string' && value.startsWith('<svg') ? value : '';
+  if (img.dataset.svg === svg) return;
+  img.dataset.svg = svg;
+  if (svg) img.src = `data:image/svg+xml;charset=utf-8,${encodeURIComponent(svg)}`;
+  else img.removeAttribute('src');
+  img.hidden = !svg;
+}
+
+export function valueOf(el, control) {
   if (control.kind === 'check') return el.checked;
   if (el.value === '' && (control.kind === 'number' || control.kind === 'date')) return null;
   return el.value;
@@ -78,15 +94,23 @@ function nodeTexts(screen) {
   return texts;
 }
 
-// Fills `element` with the form; `send(control, value)` posts a change.
-export function renderForm(element, screen, send) {
+// The keys of the nodes of the form's trees.
+export function nodeKeys(screen) {
+  const keys = new Set();
+  for (const t of screen.trees ?? []) for (const n of t.nodes) keys.add(n.key);
+  return keys;
+}
+
+// Fills `element` with the form's controls that `include` takes (all by
+// default); `send(control, value)` posts a change.
+export function renderForm(element, screen, send, include = () => true) {
   element.replaceChildren();
   const hidden = hiddenByTree(screen);
   const legends = nodeTexts(screen);
   const groups = new Map();
   for (const c of screen.controls) {
     if (['grid', 'tree', 'tabstrip', 'splitter', 'button'].includes(c.kind)) continue;
-    if (hidden(c.group)) continue;
+    if (hidden(c.group) || !include(c)) continue;
     const group = c.group || '';
     if (!groups.has(group)) groups.set(group, []);
     groups.get(group).push(c);
@@ -99,16 +123,25 @@ export function renderForm(element, screen, send) {
       fieldset.append(legend);
     }
     for (const c of controls) {
-      const row = document.createElement('label');
+      const shownOnly = c.kind === 'picture' || c.kind === 'label';
+      const row = document.createElement(shownOnly ? 'div' : 'label');
       row.className = `field field-${c.kind}`;
-      const caption = document.createElement('span');
-      caption.className = 'caption';
-      caption.textContent = c.caption || c.name;
       const input = inputFor(c);
       input.dataset.control = c.name;
-      input.name = c.name;
-      input.addEventListener('change', () => send(c, valueOf(input, c)));
-      row.append(caption, input);
+      if (!shownOnly) {
+        input.name = c.name;
+        input.addEventListener('change', () => send(c, valueOf(input, c)));
+      }
+      // A picture or a text shown without a caption takes the whole row.
+      if (c.caption || !shownOnly) {
+        const caption = document.createElement('span');
+        caption.className = 'caption';
+        caption.textContent = c.caption || c.name;
+        row.append(caption);
+      } else {
+        row.classList.add('uncaptioned');
+      }
+      row.append(input);
       if (c.hint && c.prompt) {
         const hint = document.createElement('small');
         hint.className = 'hint';
@@ -130,6 +163,7 @@ export function updateForm(element, screen) {
     if (c.kind === 'check') input.checked = c.value === true;
     else if (c.kind === 'date') input.value = typeof c.value === 'string' ? c.value.slice(0, 10) : '';
     else if (c.kind === 'label') input.textContent = c.value ?? '';
+    else if (c.kind === 'picture') setPicture(input, c.value);
     else input.value = c.value === null || c.value === undefined ? '' : String(c.value);
   }
 }

@@ -4,7 +4,7 @@
 import './style.css';
 import { ApiError, Connection } from './api.js';
 import { Dialogs } from './dialogs.js';
-import { AttributeGrid, hiddenByTree, renderForm, renderTree, updateForm } from './form.js';
+import { AttributeGrid, hiddenByTree, nodeKeys, renderForm, renderTree, updateForm, valueOf } from './form.js';
 import { ListGrid } from './grid.js';
 import { RowsTable } from './rows.js';
 
@@ -164,6 +164,7 @@ async function refreshForm(screen, force = '') {
   }
   screen.description = d;
   if (screen.form) updateForm(screen.form, d);
+  if (screen.nodeForm) updateForm(screen.nodeForm, d);
   for (const a of screen.attributes) {
     const info = d.attributeGrids.find((x) => x.name === a.name);
     if (info) a.update(info, force);
@@ -220,19 +221,24 @@ function render(screen) {
   screen.grids = [];
   screen.attributes = [];
   screen.form = null;
+  screen.nodeForm = null;
   screen.view.replaceChildren(toolbar(screen));
   screen.view.dataset.kind = d.kind;
+  // A changed value is sent; the screen's events may change others, which the form then takes.
+  const send = (control, value) =>
+    track(
+      connection
+        .post(`/api/screens/${d.id}/values`, { control: control.name, value })
+        .then(() => (control.group && nodeKeys(d).has(control.group) ? refreshForm(screen) : null))
+        .catch(reportError),
+    );
+  // Controls of a tree's node stand with that node's lists, the others at the top.
+  const ofNode = (c) => nodeKeys(d).has(c.group);
   if (d.kind === 'detail') {
     const form = document.createElement('form');
     form.className = 'detail';
     form.addEventListener('submit', (e) => e.preventDefault());
-    renderForm(form, d, (control, value) =>
-      track(
-        connection
-          .post(`/api/screens/${d.id}/values`, { control: control.name, value })
-          .catch(reportError),
-      ),
-    );
+    renderForm(form, d, send, (c) => !ofNode(c));
     screen.view.append(form);
     screen.form = form;
     for (const info of d.attributeGrids ?? []) {
@@ -285,11 +291,56 @@ function render(screen) {
       onError: reportError,
       onWrite: track,
     };
+    if (d.kind === 'detail' && g.editable) callbacks.onCurrent = (key) => chooseRow(screen, g.name, key);
     const grid =
       d.kind === 'detail' && g.editable
         ? new RowsTable(holder, connection, d, g, callbacks)
         : new ListGrid(holder, connection, d, g, callbacks);
     screen.grids.push(grid);
+  }
+  if (trees.length) {
+    const nodeForm = document.createElement('form');
+    nodeForm.className = 'detail node-controls';
+    nodeForm.addEventListener('submit', (e) => e.preventDefault());
+    renderForm(nodeForm, d, send, ofNode);
+    if (nodeForm.childElementCount) {
+      lists.append(nodeForm);
+      screen.nodeForm = nodeForm;
+    }
+  }
+}
+
+// The row the person stands on in a form's grid; the form then shows what
+// follows it (a preview of the row).
+function chooseRow(screen, grid, row) {
+  return track(
+    connection
+      .post(`/api/screens/${screen.description.id}/current`, { grid, row })
+      .then(() => refreshForm(screen))
+      .catch(reportError),
+  );
+}
+
+// A file a screen wrote for the person: fetched once and saved by the browser.
+async function download(file) {
+  try {
+    const response = await fetch(`/api/downloads/${encodeURIComponent(file.token)}`, {
+      headers: { 'X-Pelta-Session': connection.session },
+      credentials: 'same-origin',
+    });
+    if (!response.ok) throw new ApiError(response.status, response.statusText);
+    const url = URL.createObjectURL(await response.blob());
+    const a = document.createElement('a');
+    a.href = url;
+    a.download = file.name;
+    a.hidden = true;
+    document.body.append(a);
+    a.click();
+    a.remove();
+    setTimeout(() => URL.revokeObjectURL(url), 60000);
+    status(`Запазен файл ${file.name}`);
+  } catch (e) {
+    reportError(e);
   }
 }
 
@@ -413,11 +464,39 @@ async function drawScreen(id, bringForward) {
     screens.set(id, screen);
   }
   const isNew = !screen.drawn;
+  const typing = screen.drawn ? typedField(screen) : null;
   screen.description = description;
   render(screen);
+  if (typing) keepTyping(screen, typing);
   screen.drawn = true;
   if (bringForward || isNew) activate(id);
   else screen.view.hidden = active !== id;
+}
+
+// The field of the screen the person is typing in, when its text is no
+// longer what the server held (not sent yet: a field sends when it is left).
+function typedField(screen) {
+  const el = document.activeElement;
+  if (!(el instanceof HTMLElement) || !screen.view.contains(el) || !el.dataset.control) return null;
+  if (!(el instanceof HTMLInputElement || el instanceof HTMLTextAreaElement) || el.type === 'checkbox') return null;
+  const control = screen.description.controls.find((c) => c.name === el.dataset.control);
+  const held = control?.value === null || control?.value === undefined ? '' : String(control.value);
+  return control && el.value !== held ? { name: control.name, value: el.value } : null;
+}
+
+// A redraw keeps what the person was typing: the new field takes it, keeps
+// the focus, and the text is sent as leaving the field would send it.
+function keepTyping(screen, typing) {
+  const el = screen.view.querySelector(`[data-control="${CSS.escape(typing.name)}"]`);
+  const control = screen.description.controls.find((c) => c.name === typing.name);
+  if (!el || !control || control.readOnly || !('value' in el)) return;
+  el.value = typing.value;
+  el.focus();
+  track(
+    connection
+      .post(`/api/screens/${screen.description.id}/values`, { control: control.name, value: valueOf(el, control) })
+      .catch(reportError),
+  );
 }
 
 function removeScreen(id) {
@@ -475,6 +554,7 @@ function listen() {
   connection.listen({
     dialog: (d) => dialogs.show(d),
     'dialog-closed': (d) => dialogs.closed(d.id),
+    download: (f) => download(f),
     screen: (e) => {
       if (e.change === 'closed') removeScreen(e.screen);
       else if (e.change === 'opened' && (screens.has(e.screen) || loading.has(e.screen))) activate(e.screen);

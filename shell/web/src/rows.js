@@ -103,11 +103,13 @@ export class RowsTable {
     return el;
   }
 
+  // The person stands on a row: the screen is told (its preview follows the row).
   stand(key) {
     if (this.current === key) return;
     this.current = key;
     for (const tr of this.element.querySelectorAll('tr[data-row]'))
       tr.classList.toggle('current', tr.dataset.row === key);
+    this.callbacks.onCurrent?.(key);
   }
 
   async edit(row, column, value) {
