@@ -22,6 +22,13 @@ function track(promise) {
   return promise;
 }
 
+// An action that depends on earlier changes starts once they have reached the
+// server (requests may otherwise overtake each other on their way).
+function afterWrites(action) {
+  const before = Promise.allSettled([...writes]);
+  return track(before.then(action));
+}
+
 async function settled() {
   if (document.activeElement instanceof HTMLElement) document.activeElement.blur();
   await Promise.allSettled([...writes]);
@@ -100,6 +107,8 @@ async function save(screen) {
   status('Записване...');
   try {
     const reply = await connection.post(`/api/screens/${screen.description.id}/save`);
+    // The form shows what was saved (a code the service gave, its lists).
+    await showScreen(screen.description.id, false);
     status(reply.unchanged ? 'Няма промени за запис' : reply.saved ? 'Записано' : 'Не е записано');
   } catch (e) {
     status('Не е записано');
@@ -183,7 +192,7 @@ function attributeActions(screen, grid) {
   const base = `/api/screens/${screen.description.id}`;
   return {
     set: (field, value) =>
-      track(
+      afterWrites(() =>
         connection
           .post(`${base}/attributes`, { grid, field, value })
           .then((reply) => {
@@ -194,7 +203,7 @@ function attributeActions(screen, grid) {
           .catch(reportError),
       ),
     button: (field) =>
-      track(
+      afterWrites(() =>
         connection
           .post(`${base}/attributebutton`, { grid, field })
           .then(() => redraw(screen, `[data-attributes="${CSS.escape(grid)}"] [name="${CSS.escape(field)}"]`))
@@ -206,7 +215,7 @@ function attributeActions(screen, grid) {
 }
 
 function activateNode(screen, tree, key) {
-  return track(
+  return afterWrites(() =>
     connection
       .post(`/api/screens/${screen.description.id}/activate`, { tree, key })
       .then(() => redraw(screen, `[data-tree="${CSS.escape(tree)}"] [data-node="${CSS.escape(key)}"]`))
