@@ -500,6 +500,7 @@ void frmItemsDetails::Terminate() {
     m_oSplitters.clear();
     m_oBound.clear();
     m_oDocs.clear();
+    TerminateRefs(m_oItemsSelector, m_oPartnersSelector);
     cDetailFrame::Terminate();
 }
 

@@ -66,6 +66,8 @@ private:
     void pvProposePrices();
     void pvPriceWithVat(IGridExtender& Grid, const std::string& Column);
     void pvPickAttribute(const std::string& Field);
+    bool pvPickRecord(const std::string& Field);
+    std::string pvAttributeCaption(const std::string& Field) const;
 
     // bills of materials (frmItemsDetailsBoms.cpp)
     std::string pvBomOfNode(const std::string& Key) const;
@@ -93,6 +95,8 @@ private:
     std::string m_sBom;                               // the last bill of materials shown
     std::map<std::string, RecordsetRef> m_oBound;     // grid control → the rows it shows
     std::map<std::string, pelta::ObjectRef> m_oDocs;  // document node → list control
+    pelta::ObjectRef m_oItemsSelector;                // the item attributes' selector
+    pelta::ObjectRef m_oPartnersSelector;             // the partner attributes' selector
 };
 
 }  // namespace PeltaNom15
