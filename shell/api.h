@@ -21,6 +21,7 @@
 //   POST   /api/screens/N/activate {tree?, key}   a tree node clicked
 //   DELETE /api/screens/N      ?force=1        closes the screen
 //   POST   /api/dialog/N       {button, value?} answers a waiting dialog
+//                              {button, current?, selected?} a selector's rows
 //
 // The session travels in the X-Pelta-Session header, the "session" query
 // parameter (event streams and beacons) or the pelta_session cookie. Errors
