@@ -119,11 +119,13 @@ void BM_BareSqliteItemRows(benchmark::State& state) {
         auto st = db->prepare(
             "SELECT m.name FROM sqlite_schema m JOIN pragma_table_info(m.name) c "
             "WHERE m.type = 'table' AND c.name = 'Itm_ID' AND m.name <> 'nom_items'");
-        while (st->step()) tables.emplace_back(st->text(0));
+        while (st->step())
+            tables.emplace_back(st->text(0));
     }
     std::vector<std::unique_ptr<pelta::bll::Statement>> reads;
     reads.push_back(db->prepare("SELECT * FROM nom_items WHERE ID = ?1"));
-    for (const auto& t : tables) reads.push_back(db->prepare("SELECT * FROM " + t + " WHERE Itm_ID = ?1"));
+    for (const auto& t : tables)
+        reads.push_back(db->prepare("SELECT * FROM " + t + " WHERE Itm_ID = ?1"));
     size_t i = 0;
     int64_t cells = 0;
     for (auto _ : state) {

@@ -8,6 +8,7 @@
 #include "framework/form_extender.h"
 #include "framework/grid_extender.h"
 #include "framework/record_deletion.h"
+#include "library/contracts/Public.h"
 #include "platform/automation/ascii.h"
 #include "platform/automation/error.h"
 #include "platform/automation/registry.h"
@@ -298,6 +299,40 @@ int32_t FrameworkServices::MsgBox(const std::string& Text, int32_t Style,
     p.caption = Caption;
     p.details = Details;
     return agent->messageBox(p);
+}
+
+bool FrameworkServices::ShowSelector(pelta::Object* Selector, const std::string& Caption,
+                                     pelta::Variant& Result) {
+    static constexpr const char* kSource = "FrameworkServices.ShowSelector";
+    Result = pelta::Variant();
+    auto* selector = pelta::query<IZonSelector>(Selector);
+    if (!selector)
+        pelta::raise(pelta::errc::InvalidProcedureCall, "The object shown is not a selector",
+                     kSource);
+    pelta::Ref<FormExtender> form(formOfOwner(Selector));
+    // The list's own grid: "geCtl" when it has one, else the first it made.
+    pelta::Ref<GridExtender> grid;
+    for (GridExtender* g : gridsOfOwner(Selector))
+        if (!grid || equalsNoCaseAscii(g->GridName(), "geCtl")) grid = g;
+    if (!form || !grid)
+        pelta::raise(pelta::errc::ObjectRequired,
+                     "The selector has no list to show: it is shown after its InitClientSite",
+                     kSource);
+    auto agent = currentUserAgent();
+    if (!agent)
+        pelta::raise(pelta::errc::Fail,
+                     "No user agent shows the selector \"" + form->Caption() + "\"", kSource);
+    // Read when first shown; later shown as it stands, with the person's filter.
+    if (!grid->Rows() && (!form->Refresh() || !grid->Rows())) return false;
+    ListPick pick;
+    pick.caption = Caption.empty() ? form->Caption() : Caption;
+    pick.selector = Selector;
+    pick.form = form.get();
+    pick.grid = grid.get();
+    if (!agent->chooseFromList(pick)) return false;
+    // What the person left in the grid is the choice; the selector answers it.
+    pelta::Variant current, search;
+    return selector->ShowSelect(current, search, Result);
 }
 
 pelta::ObjectRef FrameworkServices::CreateObject(const std::string& ProgID) {

@@ -158,6 +158,11 @@ public:
     pelta::Ref<PeltaNom15::IRecordDeletion> RecordDeletion() override;
     int32_t MousePointer() override;
     void SetMousePointer(int32_t Pointer) override;
+    // Through the calling thread's user agent (chooseFromList); raises when
+    // there is none, when the object is no selector or has no list yet. The
+    // list is read first when its grid has nothing bound.
+    bool ShowSelector(pelta::Object* Selector, const std::string& Caption,
+                      pelta::Variant& Result) override;
 
     pelta::Ref<fw::HostApplication> host();
     void setHostApplication(pelta::Ref<fw::HostApplication> host);

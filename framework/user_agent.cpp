@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "framework/grid_extender.h"
 #include "framework/services.h"
 #include "library/contracts/Constants.h"
 
@@ -71,6 +72,25 @@ ScriptedUserAgent& ScriptedUserAgent::cancelSaveFile(std::string expectTitle) {
     return *this;
 }
 
+ScriptedUserAgent& ScriptedUserAgent::answerSelector(std::string criterion,
+                                                     std::string expectText) {
+    return answerSelectorRows({std::move(criterion)}, std::move(expectText));
+}
+
+ScriptedUserAgent& ScriptedUserAgent::answerSelectorRows(std::vector<std::string> criteria,
+                                                         std::string expectText) {
+    if (criteria.empty()) throw std::logic_error("A selector is answered with at least one row");
+    std::lock_guard lock(mutex_);
+    selectorAnswers_.push_back(SelectorAnswer{std::move(criteria), std::move(expectText)});
+    return *this;
+}
+
+ScriptedUserAgent& ScriptedUserAgent::cancelSelector(std::string expectText) {
+    std::lock_guard lock(mutex_);
+    selectorAnswers_.push_back(SelectorAnswer{{}, std::move(expectText)});
+    return *this;
+}
+
 ScriptedUserAgent::Answer ScriptedUserAgent::takeAnswer(const Prompt& prompt, bool input) {
     // Called with the mutex held; the prompt is already recorded.
     auto refuse = [&](const std::string& why) -> Answer {
@@ -126,6 +146,47 @@ std::optional<std::filesystem::path> ScriptedUserAgent::saveFile(const Prompt& p
     return a.path;
 }
 
+bool ScriptedUserAgent::chooseFromList(const ListPick& pick) {
+    Prompt prompt;
+    prompt.kind = PromptKind::Selector;
+    prompt.text = pick.caption;
+    prompt.caption = pick.caption;
+    SelectorAnswer a;
+    auto refuse = [&](const std::string& why) {
+        {
+            std::lock_guard lock(mutex_);
+            unscripted_.push_back(prompt);
+        }
+        throw UnscriptedPrompt(why + ": the selector \"" + pick.caption + "\"");
+    };
+    {
+        std::lock_guard lock(mutex_);
+        prompts_.push_back(prompt);
+        if (selectorAnswers_.empty()) {
+            unscripted_.push_back(prompt);
+            throw UnscriptedPrompt("No answer was scripted for the selector \"" + pick.caption +
+                                   "\"");
+        }
+        a = std::move(selectorAnswers_.front());
+        selectorAnswers_.pop_front();
+    }
+    if (!a.expectText.empty() && pick.caption.find(a.expectText) == std::string::npos)
+        refuse("The scripted answer expected a caption containing \"" + a.expectText + "\"");
+    if (a.rows.empty()) return false;
+    if (!pick.grid) refuse("The selector shows no grid");
+    // Outside the lock: moving in the grid raises the list's events.
+    GridExtender& grid = *pick.grid;
+    std::vector<pelta::Variant> marks;
+    for (const std::string& criterion : a.rows) {
+        if (!grid.MoveToRow(criterion)) refuse("No row shown matches " + criterion);
+        marks.push_back(grid.CurrentBookmark());
+    }
+    if (marks.size() > 1 && !grid.MultiSelect()) grid.SetMultiSelect(true);
+    grid.SetSelectedBookmarks(marks.size() > 1 ? marks : std::vector<pelta::Variant>{});
+    grid.SetCurrentBookmark(marks.front());
+    return true;
+}
+
 std::vector<Prompt> ScriptedUserAgent::prompts() const {
     std::lock_guard lock(mutex_);
     return prompts_;
@@ -147,7 +208,7 @@ Prompt ScriptedUserAgent::last() const {
 
 size_t ScriptedUserAgent::pending() const {
     std::lock_guard lock(mutex_);
-    return answers_.size() + saveAnswers_.size();
+    return answers_.size() + saveAnswers_.size() + selectorAnswers_.size();
 }
 
 std::vector<Prompt> ScriptedUserAgent::unscripted() const {
@@ -159,6 +220,7 @@ void ScriptedUserAgent::clear() {
     std::lock_guard lock(mutex_);
     answers_.clear();
     saveAnswers_.clear();
+    selectorAnswers_.clear();
     prompts_.clear();
     unscripted_.clear();
 }

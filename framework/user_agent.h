@@ -26,6 +26,7 @@ enum class PromptKind {
     Anchored,    // a message shown at a control, with title and hint
     InputBox,    // prompt and title; answers a value or cancel
     SaveFile,    // a save-file dialog; answers a path or cancel
+    Selector,    // a list shown for choosing; its caption is the text
 };
 
 struct Prompt {
@@ -51,6 +52,15 @@ std::vector<int32_t> buttonsOfStyle(int32_t style);
 bool isQuestion(int32_t style);
 
 class FormExtender;
+class GridExtender;
+
+// A selector's list shown for choosing (FrameworkServices::ShowSelector).
+struct ListPick {
+    std::string caption;
+    pelta::Object* selector = nullptr;  // the list control
+    FormExtender* form = nullptr;       // its form extender
+    GridExtender* grid = nullptr;       // the grid the person chooses in
+};
 
 class UserAgent : public virtual pelta::Object {
 public:
@@ -70,6 +80,14 @@ public:
     // moved to another record): a host with windows brings it forward. The
     // default does nothing, as a test needs nothing shown.
     virtual void documentShown(FormExtender& form) { (void)form; }
+    // Shows a selector's list: the person stands on or marks rows of
+    // `pick.grid` (the list's quick filter works meanwhile) and chooses
+    // (True), the grid's current row and marks then telling what, or cancels
+    // (False). The default cancels, as an agent that shows no lists must.
+    virtual bool chooseFromList(const ListPick& pick) {
+        (void)pick;
+        return false;
+    }
 };
 
 // Thrown by the scripted agent when a screen asks what the test did not
@@ -99,11 +117,22 @@ public:
     // answers have their own queue.
     ScriptedUserAgent& answerSaveFile(std::filesystem::path path, std::string expectTitle = {});
     ScriptedUserAgent& cancelSaveFile(std::string expectTitle = {});
+    // The next selector is answered by standing on the first row of its grid
+    // that matches the criterion ("Code = '0000003'"), among the rows its
+    // filters leave; with several criteria those rows are marked, the first
+    // current. No such row throws UnscriptedPrompt. `expectText` must then be
+    // part of the selector's caption. Selectors take their answers in order,
+    // apart from the other prompts.
+    ScriptedUserAgent& answerSelector(std::string criterion, std::string expectText = {});
+    ScriptedUserAgent& answerSelectorRows(std::vector<std::string> criteria,
+                                          std::string expectText = {});
+    ScriptedUserAgent& cancelSelector(std::string expectText = {});
 
     int32_t messageBox(const Prompt& prompt) override;
     void anchoredMessage(const Prompt& prompt) override;
     std::optional<pelta::Variant> inputBox(const Prompt& prompt) override;
     std::optional<std::filesystem::path> saveFile(const Prompt& prompt) override;
+    bool chooseFromList(const ListPick& pick) override;
 
     // Everything shown, in order.
     std::vector<Prompt> prompts() const;
@@ -111,7 +140,7 @@ public:
     std::vector<std::string> texts() const;
     // The last prompt; throws when nothing was shown.
     Prompt last() const;
-    size_t pending() const;  // scripted answers not used yet (save-file ones included)
+    size_t pending() const;  // scripted answers not used yet, of every kind
     std::vector<Prompt> unscripted() const;
     void clear();  // forgets prompts and answers
 
@@ -131,6 +160,11 @@ private:
         std::string expectTitle;
     };
     std::deque<SaveAnswer> saveAnswers_;
+    struct SelectorAnswer {
+        std::vector<std::string> rows;  // empty: cancelled
+        std::string expectText;
+    };
+    std::deque<SelectorAnswer> selectorAnswers_;
     std::vector<Prompt> prompts_;
     std::vector<Prompt> unscripted_;
 };

@@ -369,6 +369,16 @@ ApiResponse Api::route(const ApiRequest& r) {
         DialogAnswer answer;
         answer.button = static_cast<int32_t>(integerField(body, "button", 1, 7));
         if (body.contains("value")) answer.value = stringField(body, "value", false);
+        // A selector's answer: the rows chosen in its list.
+        answer.rows.current = stringField(body, "current", false);
+        if (auto sel = body.find("selected"); sel != body.end() && !sel->is_null()) {
+            if (!sel->is_array()) throw ApiError(400, "Field \"selected\" must be a list");
+            if (sel->size() > 100000) throw ApiError(400, "Too many selected rows");
+            for (const json& k : *sel) {
+                if (!k.is_string()) throw ApiError(400, "Selected keys must be text");
+                answer.rows.selected.push_back(k.get<std::string>());
+            }
+        }
         // Answered here, not on the session's thread: that thread is waiting for it.
         switch (s.dialogs().answer(id, answer)) {
             case DialogBroker::AnswerResult::Accepted:
@@ -423,6 +433,9 @@ ApiResponse Api::route(const ApiRequest& r) {
         }));
     }
     int64_t id = parseInteger(p[2], 1, INT64_MAX / 2, "screen id");
+    // What is asked of a screen also runs while that screen is shown in a
+    // dialog its thread waits for.
+    UiTaskTag tag(id);
     auto needScreen = [&]() -> std::shared_ptr<Screen> {
         auto screen = s.screen(id);
         if (!screen) throw ApiError(404, "No such screen");

@@ -22,6 +22,7 @@
 //   POST   /api/screens/N/current {grid, row}  the row the person stands on
 //   DELETE /api/screens/N      ?force=1        closes the screen
 //   POST   /api/dialog/N       {button, value?} answers a waiting dialog
+//                              {button, current?, selected?} a selector's rows
 //   GET    /api/downloads/T                    a file a screen wrote (once; see
 //                                              the "download" event)
 //

@@ -20,6 +20,8 @@ const char* kindName(DialogKind kind) {
             return "input";
         case DialogKind::Notice:
             return "notice";
+        case DialogKind::Selector:
+            return "selector";
         case DialogKind::Message:
             break;
     }
@@ -44,7 +46,7 @@ const char* iconName(int32_t style) {
 
 std::vector<int32_t> dialogButtons(DialogKind kind, int32_t style) {
     if (kind == DialogKind::Notice) return {vbOK};
-    if (kind == DialogKind::Input) return {vbOK, vbCancel};
+    if (kind == DialogKind::Input || kind == DialogKind::Selector) return {vbOK, vbCancel};
     switch (style & 7) {
         case vbOKCancel:
             return {vbOK, vbCancel};
@@ -88,6 +90,7 @@ std::string dialogJson(uint64_t id, const DialogRequest& r) {
         j["control"] = r.control;
         j["hint"] = r.hint;
     }
+    if (r.kind == DialogKind::Selector) j["screen"] = r.screen;
     // Texts come from screens and the database: never let invalid UTF-8 stop the page.
     return j.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
 }
@@ -95,6 +98,7 @@ std::string dialogJson(uint64_t id, const DialogRequest& r) {
 DialogBroker::DialogBroker(EventChannel& events) : events_(events) {}
 
 DialogAnswer DialogBroker::ask(const DialogRequest& request) {
+    if (request.kind == DialogKind::Selector && modalWait_) return askModal(request);
     Waiting w{0, request, std::nullopt};
     // Other sessions may run while this one waits for its person.
     ApartmentRelease letOthersRun;
@@ -127,9 +131,11 @@ DialogBroker::AnswerResult DialogBroker::answer(uint64_t id, const DialogAnswer&
             w.answer->value.reset();
         else if (!w.answer->value)
             w.answer->value = std::string();
+        if (w.request.kind != DialogKind::Selector || answer.button != vbOK) w.answer->rows = {};
     }
     events_.publish("dialog-closed", nlohmann::json{{"id", id}}.dump());
     answered_.notify_all();
+    wakeModal();
     return AnswerResult::Accepted;
 }
 
@@ -139,6 +145,54 @@ void DialogBroker::close() {
         closed_ = true;
     }
     answered_.notify_all();
+    wakeModal();
+}
+
+void DialogBroker::setModalWait(ModalWait wait, std::function<void()> wake) {
+    std::lock_guard lock(mutex_);
+    modalWait_ = std::move(wait);
+    modalWake_ = std::move(wake);
+}
+
+void DialogBroker::wakeModal() {
+    std::function<void()> wake;
+    {
+        std::lock_guard lock(mutex_);
+        wake = modalWake_;
+    }
+    if (wake) wake();
+}
+
+// The thread does not block here as for a message box: the page asks for the
+// rows of the screen shown while the person chooses, and those requests run
+// on this same thread, in the modal wait.
+DialogAnswer DialogBroker::askModal(const DialogRequest& request) {
+    Waiting w{0, request, std::nullopt};
+    const DialogAnswer dismissed{dismissButton(request.kind, request.style), std::nullopt, {}};
+    {
+        std::lock_guard lock(mutex_);
+        if (closed_) return dismissed;
+        w.id = nextId_++;
+        waiting_.push_back(&w);
+        events_.publish("dialog", dialogJson(w.id, request));
+    }
+    try {
+        modalWait_(request.screen, [&] {
+            std::lock_guard lock(mutex_);
+            return w.answer.has_value() || closed_;
+        });
+    } catch (...) {
+        std::lock_guard lock(mutex_);
+        waiting_.erase(std::find(waiting_.begin(), waiting_.end(), &w));
+        throw;
+    }
+    std::lock_guard lock(mutex_);
+    waiting_.erase(std::find(waiting_.begin(), waiting_.end(), &w));
+    if (!w.answer) {
+        w.answer = dismissed;
+        events_.publish("dialog-closed", nlohmann::json{{"id", w.id}}.dump());
+    }
+    return *w.answer;
 }
 
 bool DialogBroker::closed() const {
@@ -174,6 +228,16 @@ bool DialogBroker::inputBox(const std::string& prompt, const std::string& title,
     if (a.button != vbOK || !a.value) return false;
     value = *a.value;
     return true;
+}
+
+std::optional<RowsChoice> DialogBroker::chooseRows(int64_t screen, const std::string& caption) {
+    DialogRequest r;
+    r.kind = DialogKind::Selector;
+    r.caption = caption;
+    r.screen = screen;
+    DialogAnswer a = ask(r);
+    if (a.button != vbOK) return std::nullopt;
+    return a.rows;
 }
 
 void DialogBroker::showMessage(const std::string& control, const std::string& text,

@@ -7,6 +7,7 @@
 
 #include <condition_variable>
 #include <cstdint>
+#include <functional>
 #include <mutex>
 #include <optional>
 #include <string>
@@ -18,7 +19,9 @@ namespace pelta::shell {
 
 class EventChannel;
 
-enum class DialogKind { Message, Input, Notice };
+// Selector: a list screen shown for choosing rows, answered OK with the
+// rows chosen, or Cancel.
+enum class DialogKind { Message, Input, Notice, Selector };
 
 struct DialogRequest {
     DialogKind kind = DialogKind::Message;
@@ -29,11 +32,13 @@ struct DialogRequest {
     std::string value;    // input boxes: the default
     std::string control;  // notices: the control the message points at
     std::string hint;     // notices
+    int64_t screen = 0;   // selectors: the screen shown
 };
 
 struct DialogAnswer {
     int32_t button = 0;
     std::optional<std::string> value;  // input boxes: the text entered
+    RowsChoice rows{};                 // selectors: the rows chosen with OK
 };
 
 // Buttons a message box of this style offers, in order (vbOK, vbCancel ...).
@@ -60,12 +65,19 @@ public:
     // The dialog now waiting, if any (for a page that reconnects).
     std::optional<uint64_t> waitingId() const;
 
+    // How a selector waits on the session's thread: until `done` holds,
+    // serving the requests of `screen` meanwhile; `wake` makes it ask `done`
+    // again. Without it a selector waits as a message box does.
+    using ModalWait = std::function<void(int64_t screen, const std::function<bool()>& done)>;
+    void setModalWait(ModalWait wait, std::function<void()> wake);
+
     // UserAgent
     int32_t messageBox(const std::string& text, int32_t style, const std::string& caption,
                        const std::string& details) override;
     bool inputBox(const std::string& prompt, const std::string& title, std::string& value) override;
     void showMessage(const std::string& control, const std::string& text, const std::string& title,
                      const std::string& hint) override;
+    std::optional<RowsChoice> chooseRows(int64_t screen, const std::string& caption) override;
 
 private:
     struct Waiting {
@@ -74,7 +86,12 @@ private:
         std::optional<DialogAnswer> answer;
     };
 
+    DialogAnswer askModal(const DialogRequest& request);
+    void wakeModal();
+
     EventChannel& events_;
+    ModalWait modalWait_;
+    std::function<void()> modalWake_;
     mutable std::mutex mutex_;
     std::condition_variable answered_;
     std::vector<Waiting*> waiting_;  // a dialog may be asked while another waits

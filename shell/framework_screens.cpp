@@ -615,6 +615,54 @@ private:
     bool savedNothing_ = false;
 };
 
+// A selector's list while a screen waits for the person to choose in it: its
+// grid and quick filter only, no commands; the list belongs to the screen
+// that shows it, which terminates it, so this screen only lets go of it.
+class SelectorScreen final : public FormScreen {
+public:
+    SelectorScreen(FrameworkSession& session, pelta::ObjectRef owner, fw::FormExtender* form,
+                   std::string grid)
+        : FormScreen(session, std::move(owner), form), grid_(std::move(grid)) {}
+
+    std::string kind() override { return "selector"; }
+    std::vector<CommandInfo> commands() override { return {}; }
+    std::vector<ControlInfo> controls() override { return {}; }
+    std::vector<GridInfo> grids() override {
+        std::vector<GridInfo> out;
+        for (GridInfo& g : FormScreen::grids())
+            if (equalsNoCaseAscii(g.name, grid_)) out.push_back(std::move(g));
+        return out;
+    }
+    bool execute(int32_t, const CommandTarget&) override { return false; }
+    void setValue(const std::string& control, const Variant&) override {
+        refuse("The selector has no control " + control);
+    }
+    bool save() override { return false; }
+    bool queryTerminate() override { return true; }
+    void terminate() override { release(); }
+
+    // The rows the person chose become the grid's current row and marks;
+    // false when the current row is not one the grid shows.
+    bool choose(const RowsChoice& choice) {
+        if (!alive()) return false;
+        fw::GridExtender& g = gridNamed(grid_);
+        Variant current = rowBookmark(choice.current);
+        std::vector<Variant> marks;
+        for (const std::string& key : choice.selected) {
+            Variant bm = rowBookmark(key);
+            if (!bm.isEmpty()) marks.push_back(bm);
+        }
+        if (current.isEmpty() && !marks.empty()) current = marks.front();
+        if (current.isEmpty() || !g.SetCurrentBookmark(current)) return false;
+        if (marks.size() > 1 && !g.MultiSelect()) g.SetMultiSelect(true);
+        g.SetSelectedBookmarks(marks);
+        return true;
+    }
+
+private:
+    std::string grid_;
+};
+
 // The framework's user agent of a session's thread: the session's dialogs.
 class WebAgent final : public fw::UserAgent {
 public:
@@ -637,6 +685,7 @@ public:
     // downloads, offered to the page when the action ends.
     std::optional<std::filesystem::path> saveFile(const fw::Prompt& p) override;
     void documentShown(fw::FormExtender& form) override;
+    bool chooseFromList(const fw::ListPick& pick) override;
 
     void detach() noexcept { session_ = nullptr; }
     std::string typeName() const override { return "WebUserAgent"; }
@@ -702,6 +751,25 @@ public:
         Downloads* downloads = host_.downloads();
         if (!downloads) return std::nullopt;
         return downloads->reserve(p.fileName);
+    }
+
+    // A selector's list shown in a modal dialog; the choice is left in its grid.
+    bool chooseFromList(const fw::ListPick& pick) {
+        if (!pick.selector || !pick.form || !pick.grid) return false;
+        auto screen = std::make_shared<SelectorScreen>(*this, pelta::ObjectRef(pick.selector),
+                                                       pick.form, pick.grid->GridName());
+        const int64_t id = host_.openModalScreen(screen);
+        struct Forget {
+            ScreenHost& host;
+            SelectorScreen& screen;
+            int64_t id;
+            ~Forget() {
+                host.closeModalScreen(id);
+                screen.release();
+            }
+        } forget{host_, *screen, id};
+        std::optional<RowsChoice> choice = host_.userAgent().chooseRows(id, pick.caption);
+        return choice && screen->choose(*choice);
     }
 
     // After a command or a save: files written go to the page, closed
@@ -772,6 +840,10 @@ std::optional<std::filesystem::path> WebAgent::saveFile(const fw::Prompt& p) {
 
 void WebAgent::documentShown(fw::FormExtender& form) {
     if (session_) session_->documentShown(form);
+}
+
+bool WebAgent::chooseFromList(const fw::ListPick& pick) {
+    return session_ && session_->chooseFromList(pick);
 }
 
 bool FormScreen::execute(int32_t command, const CommandTarget& target) {

@@ -10,6 +10,7 @@
 #include <cstdint>
 #include <memory>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "platform/automation/variant.h"
@@ -238,6 +239,13 @@ public:
     virtual void gridChanged(Screen& screen, const std::string& grid) = 0;
     // Closes a screen from its own code (after a delete in a detail form).
     virtual void closeScreen(Screen& screen) = 0;
+    // A screen shown in a modal dialog while the code that shows it waits (a
+    // selector's list): reachable by its id, but not among the screens the
+    // page shows; forgotten (not terminated) when the dialog is over.
+    virtual int64_t openModalScreen(std::shared_ptr<Screen> screen) {
+        return openScreen(std::move(screen));
+    }
+    virtual void closeModalScreen(int64_t id) { (void)id; }
 };
 
 struct NavigationEntry {

@@ -53,6 +53,12 @@ Session::Session(std::string id, ScreenProvider& provider, std::string user)
       dialogs_(events_),
       downloads_(events_),
       lastActivity_(ticks(Clock::now())) {
+    // A selector's dialog waits on the thread, serving its own screen's requests.
+    dialogs_.setModalWait(
+        [this](int64_t screen, const std::function<bool()>& done) {
+            ui_.serveUntil(done, [screen](int64_t tag) { return tag == screen; });
+        },
+        [this] { ui_.wake(); });
     ui_.call([this] { library_ = provider_.startSession(*this); });
 }
 
@@ -76,7 +82,23 @@ int64_t Session::openList(const std::string& navigationId) {
 std::shared_ptr<Screen> Session::screen(int64_t id) const {
     for (const auto& [sid, s] : screens_)
         if (sid == id) return s;
+    for (const auto& [sid, s] : modal_)
+        if (sid == id) return s;
     return nullptr;
+}
+
+int64_t Session::openModalScreen(std::shared_ptr<Screen> screen) {
+    if (!screen)
+        pelta::raise(pelta::errc::ObjectVariableNotSet, "No screen to show", "pelta.shell");
+    int64_t id = nextScreen_++;
+    modal_.emplace_back(id, std::move(screen));
+    return id;
+}
+
+void Session::closeModalScreen(int64_t id) {
+    modal_.erase(
+        std::remove_if(modal_.begin(), modal_.end(), [&](const auto& p) { return p.first == id; }),
+        modal_.end());
 }
 
 std::vector<std::pair<int64_t, std::shared_ptr<Screen>>> Session::screens() const {

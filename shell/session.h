@@ -53,6 +53,8 @@ public:
     void screenChanged(Screen& screen) override;
     void gridChanged(Screen& screen, const std::string& grid) override;
     void closeScreen(Screen& screen) override;
+    int64_t openModalScreen(std::shared_ptr<Screen> screen) override;
+    void closeModalScreen(int64_t id) override;
 
     // ---- from any thread ----------------------------------------------------
     void touch() noexcept;
@@ -82,6 +84,7 @@ private:
     // Owned by the user-interface thread.
     std::unique_ptr<LibrarySession> library_;
     std::vector<std::pair<int64_t, std::shared_ptr<Screen>>> screens_;  // in opening order
+    std::vector<std::pair<int64_t, std::shared_ptr<Screen>>> modal_;    // shown in dialogs
     int64_t nextScreen_ = 1;
 
     UiThread ui_;  // last: stops first, before the members its tasks use

@@ -4,6 +4,7 @@
 #pragma once
 
 #include <condition_variable>
+#include <cstdint>
 #include <deque>
 #include <functional>
 #include <future>
@@ -28,6 +29,7 @@ public:
     UiThread& operator=(const UiThread&) = delete;
 
     // Queues a task; false when the thread has stopped (the task is dropped).
+    // The task carries the tag of the posting thread (see UiTaskTag).
     bool post(std::function<void()> task);
 
     // Runs `f` on the thread and waits for its result; its exceptions reach the
@@ -54,15 +56,45 @@ public:
     bool isCurrent() const noexcept { return std::this_thread::get_id() == id_; }
     bool stopped() const;
 
+    // A modal wait, on the thread itself within a task: until `done` holds
+    // (asked again at each wake()) runs the queued tasks whose tag `admit`
+    // takes, in their order, and leaves the others queued for later. The
+    // apartment is given up while it waits and held while a task runs.
+    // False when the thread is stopping.
+    bool serveUntil(const std::function<bool()>& done,
+                    const std::function<bool(int64_t tag)>& admit);
+    // Makes a modal wait ask its `done` again.
+    void wake();
+
 private:
+    struct Task {
+        int64_t tag = 0;
+        std::function<void()> run;
+    };
     void run();
 
     mutable std::mutex mutex_;
     std::condition_variable wake_;
-    std::deque<std::function<void()>> tasks_;
+    std::deque<Task> tasks_;
     bool stopping_ = false;
     std::thread thread_;
     std::thread::id id_;
+};
+
+// Tags the tasks the calling thread posts, for its lifetime, with the screen
+// they serve (an HTTP thread handling a request about screen 7), so that a
+// modal wait over that screen runs them. Untagged tasks carry 0.
+class UiTaskTag {
+public:
+    explicit UiTaskTag(int64_t tag);
+    ~UiTaskTag();
+    UiTaskTag(const UiTaskTag&) = delete;
+    UiTaskTag& operator=(const UiTaskTag&) = delete;
+
+    static int64_t current() noexcept;
+
+private:
+    int64_t previous_;
 };
 
 }  // namespace pelta::shell

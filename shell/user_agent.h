@@ -7,9 +7,18 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <string>
+#include <vector>
 
 namespace pelta::shell {
+
+// The rows chosen in a list shown for choosing: the keys of the row the
+// person stood on and of the rows marked.
+struct RowsChoice {
+    std::string current;
+    std::vector<std::string> selected;
+};
 
 class UserAgent {
 public:
@@ -24,6 +33,14 @@ public:
     // A message shown at a control of the screen.
     virtual void showMessage(const std::string& control, const std::string& text,
                              const std::string& title, const std::string& hint) = 0;
+    // The list screen `screen` shown in a modal dialog for choosing rows (a
+    // selector's list). While the person chooses, the calling thread keeps
+    // serving that screen's requests (its rows, its quick filter). Nothing
+    // when cancelled; the default cancels, as an agent that shows no lists.
+    virtual std::optional<RowsChoice> chooseRows(int64_t screen, const std::string& caption) {
+        (void)screen, (void)caption;
+        return std::nullopt;
+    }
 };
 
 }  // namespace pelta::shell

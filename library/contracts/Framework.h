@@ -80,6 +80,16 @@ public:
     virtual pelta::Ref<IRecordDeletion> RecordDeletion() = 0;
     virtual int32_t MousePointer() = 0;
     virtual void SetMousePointer(int32_t Pointer) = 0;
+    // Shows a selector (a list control of a library that implements
+    // IZonSelector) to the person for choosing, modally: the person stands on
+    // or marks rows of its list, using its quick filter, and chooses or
+    // cancels. On a choice the selector's ShowSelect answers `Result` (the
+    // IZonSelector::GetNextItem walk follows it). The selector must have had
+    // its InitClientSite; its list is read when it is first shown. `Caption`
+    // titles the dialog (empty: the list's caption). False when cancelled or
+    // nothing was chosen.
+    virtual bool ShowSelector(pelta::Object* Selector, const std::string& Caption,
+                              pelta::Variant& Result) = 0;
 };
 
 // Deletes records of lists and finds open detail forms.

@@ -220,6 +220,13 @@ pelta::ObjectRef CreateContragentsSelector(pelta::Object* Owner, int32_t Index) 
     return selector(own("ctxContragents"), Index, Owner, {}, "CreateContragentsSelector");
 }
 
+bool ShowSelector(pelta::Object* Selector, const std::string& Caption, pelta::Variant& Result) {
+    Result = pelta::Variant();
+    auto services = FrameworkServices();
+    if (!services || !Selector) return false;
+    return services->ShowSelector(Selector, Caption, Result);
+}
+
 pelta::ObjectRef CreateFlatSelector(pelta::Object* Owner, int32_t Kind, int32_t Index) {
     return selector(own("ctxFlat"), Index, Owner, std::to_string(Kind), "CreateFlatSelector");
 }

@@ -76,6 +76,10 @@ std::string SelectorProgID(const std::string& ProgID, int32_t Index);
 // with the owner and a parameter.
 pelta::ObjectRef CreateItemsSelector(pelta::Object* Owner, int32_t Index = 0);
 pelta::ObjectRef CreateContragentsSelector(pelta::Object* Owner, int32_t Index = 0);
+// Shows a selector made above (after its InitClientSite) to the person
+// through the framework; False when cancelled, when nothing was chosen or
+// when there is no framework. `Result` is the selector's answer.
+bool ShowSelector(pelta::Object* Selector, const std::string& Caption, pelta::Variant& Result);
 // `Kind` is the flat nomenclature's kind number, passed as text.
 pelta::ObjectRef CreateFlatSelector(pelta::Object* Owner, int32_t Kind, int32_t Index = 0);
 pelta::ObjectRef CreateMediaSelector(pelta::Object* Owner, int32_t Index = 0);

@@ -509,6 +509,7 @@ void frmItemsDetails::Terminate() {
     m_oBound.clear();
     m_oDocs.clear();
     m_oBarCodeFields.clear();
+    TerminateRefs(m_oItemsSelector, m_oPartnersSelector);
     cDetailFrame::Terminate();
 }
 

@@ -70,6 +70,8 @@ private:
     void pvProposePrices();
     void pvPriceWithVat(IGridExtender& Grid, const std::string& Column);
     void pvPickAttribute(const std::string& Field);
+    bool pvPickRecord(const std::string& Field);
+    std::string pvAttributeCaption(const std::string& Field) const;
 
     // the barcode preview (frmItemsDetailsBarcode.cpp)
     bool pvCreateBarCodePreview();
@@ -106,6 +108,8 @@ private:
     std::map<std::string, RecordsetRef> m_oBound;              // grid control → the rows it shows
     std::map<std::string, pelta::ObjectRef> m_oDocs;           // document node → list control
     std::vector<pelta::Ref<IFieldExtender>> m_oBarCodeFields;  // the preview's options
+    pelta::ObjectRef m_oItemsSelector;                         // the item attributes' selector
+    pelta::ObjectRef m_oPartnersSelector;                      // the partner attributes' selector
 };
 
 }  // namespace PeltaNom15

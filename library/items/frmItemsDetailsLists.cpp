@@ -484,10 +484,12 @@ void frmItemsDetails::pvOpenDocuments(const std::string& NodeKey) {
 
 namespace PeltaNom15 {
 
-// The selector of a cost-centre attribute: a code or a name typed by the
-// person, looked up among the cost centres of the attribute's kind; empty
-// text clears the attribute.
+// The button of a selector attribute. Items and partners are chosen in their
+// lists (pvPickRecord); a cost centre by a code or a name typed by the
+// person, looked up among the cost centres of the attribute's kind, empty
+// text clearing the attribute.
 void frmItemsDetails::pvPickAttribute(const std::string& Field) {
+    if (pvPickRecord(Field)) return;
     struct Kind {
         const char* Field;
         int32_t Type;
@@ -496,10 +498,8 @@ void frmItemsDetails::pvPickAttribute(const std::string& Field) {
     const Kind* kind = nullptr;
     for (const Kind& k : kKinds)
         if (Field == k.Field) kind = &k;
-    if (!kind) return;  // items and partners are chosen through their selectors
-    std::string caption;
-    for (const AttribDecl& a : m_oDef.Attributes)
-        if (a.Field == Field) caption = a.Caption;
+    if (!kind) return;
+    const std::string caption = pvAttributeCaption(Field);
     pelta::Variant typed(m_oAttribExt->ShownText(Field));
     if (!m_oForm->InputBox("Код или име:", caption, typed)) return;
     const std::string text = C2Str(typed);
@@ -598,6 +598,45 @@ void frmItemsDetails::pvProposePrices() {
         row->update();
     }
     grid->Refresh();
+}
+
+std::string frmItemsDetails::pvAttributeCaption(const std::string& Field) const {
+    for (const AttribDecl& a : m_oDef.Attributes)
+        if (a.Field == Field) return a.Caption;
+    return {};
+}
+
+// The item and partner attributes are chosen in the items' and the partners'
+// lists, shown as selectors; each selector is made when first needed and
+// kept while the form lives. The first chosen row is taken.
+bool frmItemsDetails::pvPickRecord(const std::string& Field) {
+    static constexpr std::string_view kItemFields[] = {"SecItm_ID", "AccItm_ID",
+                                                       "VariantParentItm_ID"};
+    static constexpr std::string_view kPartnerFields[] = {"ProducerCg_ID", "ImporterCg_ID"};
+    const bool item =
+        std::find(std::begin(kItemFields), std::end(kItemFields), Field) != std::end(kItemFields);
+    const bool partner = std::find(std::begin(kPartnerFields), std::end(kPartnerFields), Field) !=
+                         std::end(kPartnerFields);
+    if (!item && !partner) return false;
+    pelta::ObjectRef& selector = item ? m_oItemsSelector : m_oPartnersSelector;
+    if (!selector) {
+        pelta::ObjectRef made = item ? CreateItemsSelector(this) : CreateContragentsSelector(this);
+        auto* list = pelta::query<IZonListControl>(made.get());
+        if (!list || !pelta::query<IZonSelector>(made.get())) {
+            m_oForm->MsgBox(Printf("Невъзможно създаване на форма %1",
+                                   std::string(item ? "ctxItems" : "ctxContragents")),
+                            vbExclamation);
+            return true;
+        }
+        if (!list->InitClientSite(m_oSite.get())) return true;
+        selector = made;
+    }
+    pelta::Variant result;
+    if (!ShowSelector(selector.get(), pvAttributeCaption(Field), result)) return true;
+    pelta::Variant id, name, row;
+    if (!pelta::query<IZonSelector>(selector.get())->GetNextItem(id, name, row)) return true;
+    if (m_oAttribExt->UserSetValue(Field, id)) m_oAttribExt->SetShownText(Field, C2Str(name));
+    return true;
 }
 
 }  // namespace PeltaNom15

@@ -192,8 +192,10 @@ bool ctxContragents::ShowSelect(pelta::Variant& CurrentValue, pelta::Variant& Se
             return true;
         }
         // The list is shown: filtered by the text, standing on the current value.
-        // (A filter applied anew would clear the rows the person marked.)
-        if (m_oQuickFilterExt && m_oQuickFilterExt->Text(kFilterFind) != search) {
+        // (A filter applied anew would clear the rows the person marked.) No
+        // text at all leaves the list as the person filtered it.
+        if (m_oQuickFilterExt && !SearchText.isEmpty() &&
+            m_oQuickFilterExt->Text(kFilterFind) != search) {
             m_oQuickFilterExt->SetText(kFilterFind, search);
             m_oQuickFilterExt->Apply();
         }

@@ -12,7 +12,8 @@
 //    chosen barcode row and saved as a download, and a closed tab's screens
 //    terminated; and
 //    the partners' list and editor — a partner found with the quick filter,
-//    opened, changed and saved, a new one refused once and then saved;
+//    opened, changed and saved, a new one refused once and then saved; an
+//    item's producer chosen in the partners' list shown as a modal selector;
 //  * the shell over its fixture screens (shell_fixture_server): a list of a
 //    million rows paged from the server, sorting, shortcuts, a detail form
 //    with its validation message, questions and input boxes as modal dialogs,
@@ -85,6 +86,16 @@ async function launchBrowser() {
     locale: 'bg-BG',
   });
   return { context, close: async () => { await context.close(); rmSync(profile, { recursive: true, force: true }); } };
+}
+
+// A field's value once the page has drawn `expected` into it (a reused form
+// is drawn anew a moment after the command that showed it), else what it holds.
+async function valueOnceDrawn(field, expected) {
+  for (let i = 0; i < 100; i++) {
+    if ((await field.inputValue()) === expected) break;
+    await new Promise((r) => setTimeout(r, 50));
+  }
+  return field.inputValue();
 }
 
 // The dialog now shown, and a click on one of its buttons.
@@ -249,10 +260,9 @@ describe('pelta serve', () => {
     await items.locator('.ag-row').first().click();
     await page.keyboard.press('Control+n');
     const detail = page.locator('section.screen[data-kind=detail]:not([hidden])');
-    const txtCode = detail.locator('[data-control=txtCode]');
-    // The form shown for the last item is drawn anew for the new one.
-    for (let i = 0; i < 100 && (await txtCode.inputValue()) !== ''; i++) await page.waitForTimeout(50);
-    assert.equal(await txtCode.inputValue(), '');
+    await detail.locator('[data-control=txtCode]').waitFor();
+    // The form the list reuses is drawn anew for the new product.
+    assert.equal(await valueOnceDrawn(detail.locator('[data-control=txtCode]'), ''), '');
     // The defaults of a new product: VAT group "Б" among the attributes.
     assert.equal(await detail.locator('select[name=TaxGroup] option:checked').textContent(), 'Б');
     await commitAttribute('Name2', 'Second name');
@@ -325,6 +335,59 @@ describe('pelta serve', () => {
     await page.locator('.tab', { hasText: 'Продукти и материали' }).click();
     await search.fill('');
     await search.press('Enter');
+  test('the producer of an item is chosen in the partners\' list shown in a dialog', async () => {
+    const items = page.locator('section.screen[data-kind=list]:not([hidden])');
+    const detail = page.locator('section.screen[data-kind=detail]:not([hidden])');
+    const openItem = async () => {
+      await page.locator('.tab', { hasText: 'Продукти и материали' }).click();
+      const search = items.locator('.quick-filter input[name=filter-802]');
+      await search.fill('/0000005');
+      await search.press('Enter');
+      await items.locator('.footer', { hasText: /Записи: 1$/ }).waitFor();
+      await items.locator('.ag-row[row-index="0"]', { hasText: '0000005' }).dblclick();
+      await detail.locator('[data-control=txtCode]').waitFor();
+      assert.equal(await valueOnceDrawn(detail.locator('[data-control=txtCode]'), '0000005'), '0000005');
+    };
+    await openItem();
+    const producer = () => detail.locator('tr[data-field=ProducerCg_ID]');
+    await producer().locator('button').click();
+
+    // The partners' list in a modal dialog, filtered by a name.
+    const dialog = page.locator('dialog[open][data-kind=selector]');
+    await dialog.locator('h3', { hasText: 'Производител' }).waitFor();
+    await dialog.locator('.footer', { hasText: /Записи: \d+$/ }).waitFor();
+    const cell = dialog.locator('.ag-row[row-index="3"] .ag-cell[col-id="Name"]');
+    let name = '';
+    for (let i = 0; i < 100 && name === ''; i++) {
+      name = ((await cell.textContent()) ?? '').trim();
+      if (name === '') await page.waitForTimeout(50);
+    }
+    assert.ok(name.length > 3, name);
+    const filter = dialog.locator('.quick-filter input');
+    await filter.fill(name);
+    await filter.press('Enter');
+    await dialog.locator('.footer', { hasText: /Записи: 1$/ }).waitFor();
+    await dialog.locator('.ag-row[row-index="0"]', { hasText: name }).click();
+    await page.screenshot({ path: path.join(shotDir, 'pelta-item-selector.png') });
+    await dialog.getByRole('button', { name: 'Избор', exact: true }).click();
+    await dialog.waitFor({ state: 'detached' });
+    await producer().locator('.attrib-shown', { hasText: name }).waitFor();
+    await Promise.all([page.waitForResponse((r) => r.url().endsWith('/save')), page.keyboard.press('Control+s')]);
+    await page.locator('#status', { hasText: 'Записано' }).waitFor();
+
+    // "Отказ" leaves the importer as it was.
+    const importer = detail.locator('tr[data-field=ImporterCg_ID]');
+    await importer.locator('button').click();
+    await dialog.locator('.ag-row').first().waitFor();
+    await dialog.getByRole('button', { name: 'Отказ', exact: true }).click();
+    await dialog.waitFor({ state: 'detached' });
+    assert.equal((await importer.locator('.attrib-shown').textContent()).trim(), '');
+
+    // Closed and opened again, the item reads its producer from the database.
+    await detail.locator('button.close').click();
+    await detail.waitFor({ state: 'detached' });
+    await openItem();
+    await producer().locator('.attrib-shown', { hasText: name }).waitFor();
   });
 
   test('a closed tab releases its session and terminates its screens', async () => {

@@ -141,6 +141,9 @@ public:
         pointer = Pointer;
         pointerHistory.push_back(Pointer);
     }
+    bool ShowSelector(pelta::Object*, const std::string&, pelta::Variant&) override {
+        return false;  // a host that shows no lists
+    }
 
     // IHostApplication
     std::string LogName() override { return logName; }

@@ -463,6 +463,111 @@ TEST_F(LibraryScreensTest, ANewPartnerIsCheckedSavedAndShownInTheList) {
     EXPECT_EQ(filter(list, "Браузър Тест"), 1);
 }
 
+// ---- a selector shown in a dialog
+
+class ItemSelectorScreensTest : public LibraryScreensTest {
+protected:
+    // The item of that code opened from the items' list; answers its screen.
+    int64_t openItem(const std::string& code) {
+        json list = ok("POST", "/api/lists", R"({"id":"PeltaNom15.ctxItems"})");
+        items_ = list["id"];
+        EXPECT_EQ(filter(items_, "/" + code), 1);
+        std::string key = ok("GET", path(items_, "rows"), {}, {{"count", "1"}})["rows"][0]["key"];
+        return showing(items_, {{"command", 102}, {"current", key}});
+    }
+    // The attribute's button pressed; answers the dialog it shows and the
+    // request, which waits for the dialog.
+    std::pair<json, std::future<ApiResponse>> pressButton(int64_t detail,
+                                                          const std::string& field) {
+        uint64_t after = live().events().lastSequence();
+        auto pending = std::async(std::launch::async, [=, this] {
+            return call("POST", path(detail, "attributebutton"), json{{"field", field}}.dump());
+        });
+        return {nextEvent(live().events(), "dialog", after), std::move(pending)};
+    }
+    json attribute(int64_t detail, const std::string& field) {
+        const json d = ok("GET", path(detail));
+        for (const json& g : d["attributeGrids"])
+            for (const json& r : g["rows"])
+                if (r["field"] == field) return r;
+        ADD_FAILURE() << "no attribute " << field;
+        return {};
+    }
+    ApiResponse answer(const json& dialog, const json& body) {
+        return call("POST", "/api/dialog/" + std::to_string(dialog["id"].get<uint64_t>()),
+                    body.dump());
+    }
+
+    int64_t items_ = 0;
+};
+
+TEST_F(ItemSelectorScreensTest, TheProducerIsChosenInThePartnersListShownInADialog) {
+    int64_t detail = openItem("0000007");
+    const std::string name = scalar("SELECT Name FROM nom_contragents WHERE Code = '4'");
+    const std::string id = scalar("SELECT ID FROM nom_contragents WHERE Code = '4'");
+
+    auto [dialog, pending] = pressButton(detail, "ProducerCg_ID");
+    EXPECT_EQ(dialog["kind"], "selector");
+    EXPECT_EQ(dialog["caption"], "Производител");
+    EXPECT_EQ(dialog["buttons"], json({PeltaNom15::vbOK, PeltaNom15::vbCancel}));
+    const int64_t selector = dialog["screen"];
+
+    // While the item's request waits, the list in the dialog is described,
+    // paged and filtered on the same session's thread.
+    json d = ok("GET", path(selector));
+    EXPECT_EQ(d["kind"], "selector");
+    EXPECT_EQ(d["caption"], "Контрагенти");
+    EXPECT_TRUE(d["commands"].empty());
+    ASSERT_EQ(d["grids"].size(), 1u);
+    EXPECT_EQ(d["grids"][0]["rowCount"], count("SELECT COUNT(*) FROM nom_contragents"));
+    EXPECT_EQ(filter(selector, name), 1);
+    std::string key = ok("GET", path(selector, "rows"), {}, {{"count", "1"}})["rows"][0]["key"];
+    EXPECT_EQ(ok("POST", path(selector, "execute"), R"({"command":101})")["handled"], false)
+        << "a selector offers no commands";
+    EXPECT_EQ(pending.wait_for(std::chrono::milliseconds(0)), std::future_status::timeout);
+
+    EXPECT_EQ(answer(dialog, {{"button", 1}, {"current", key}, {"selected", {key}}}).status, 200);
+    EXPECT_EQ(pending.get().status, 200);
+    json producer = attribute(detail, "ProducerCg_ID");
+    EXPECT_EQ(producer["value"], id);
+    EXPECT_EQ(producer["text"], name);
+    EXPECT_EQ(call("GET", path(selector)).status, 404) << "gone with its dialog";
+
+    ASSERT_EQ(ok("POST", path(detail, "save"), "{}")["saved"], true);
+    EXPECT_EQ(scalar("SELECT ProducerCg_ID FROM nom_items WHERE Code = '0000007'"), id);
+}
+
+TEST_F(ItemSelectorScreensTest, ACancelledSelectorLeavesTheAttributeAndBadAnswersAreRefused) {
+    int64_t detail = openItem("0000007");
+    auto [dialog, pending] = pressButton(detail, "SecItm_ID");
+    EXPECT_EQ(dialog["caption"], "Продукт");
+    const int64_t selector = dialog["screen"];
+    EXPECT_EQ(ok("GET", path(selector))["caption"], "Продукти и материали");
+    EXPECT_EQ(answer(dialog, {{"button", 1}, {"selected", "x"}}).status, 400);
+    EXPECT_EQ(answer(dialog, {{"button", 1}, {"selected", {1}}}).status, 400);
+    EXPECT_EQ(answer(dialog, {{"button", 6}}).status, 400);
+    EXPECT_EQ(answer(dialog, {{"button", 2}}).status, 200);
+    EXPECT_EQ(pending.get().status, 200);
+    EXPECT_TRUE(attribute(detail, "SecItm_ID")["value"].is_null());
+
+    // A row key the list does not have chooses nothing.
+    auto [again, waiting] = pressButton(detail, "SecItm_ID");
+    EXPECT_EQ(answer(again, {{"button", 1}, {"current", "999999"}}).status, 200);
+    EXPECT_EQ(waiting.get().status, 200);
+    EXPECT_TRUE(attribute(detail, "SecItm_ID")["value"].is_null());
+}
+
+TEST_F(ItemSelectorScreensTest, ASessionEndingDuringASelectorUnwindsAndReleasesEverything) {
+    int64_t detail = openItem("0000007");
+    auto [dialog, pending] = pressButton(detail, "ImporterCg_ID");
+    ok("GET", path(dialog["screen"].get<int64_t>(), "rows"), {}, {{"count", "5"}});
+    sessions_->release(session_);  // the tab went away with the dialog up
+    EXPECT_LT(pending.get().status, 500);
+    auto canUnload = reinterpret_cast<pelta::HResult (*)()>(
+        pelta::serverEntryPoint(PELTA_LIBRARY_FILE, "DllCanUnloadNow"));
+    EXPECT_EQ(canUnload(), pelta::kOk) << "the selector went with its form";
+}
+
 }  // namespace
 }  // namespace pelta::shell
 

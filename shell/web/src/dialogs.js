@@ -61,6 +61,11 @@ export class Dialogs {
     el.replaceChildren();
     el.dataset.kind = d.kind;
     el.dataset.dialogId = String(d.id);
+    if (d.kind === 'selector' && this.selector) {
+      this.selector.show(d, el, (button, body) => this.answer(button, body));
+      this.onShown?.(d);
+      return;
+    }
 
     const form = document.createElement('form');
     form.method = 'dialog';
@@ -130,7 +135,8 @@ export class Dialogs {
     this.onShown?.(d);
   }
 
-  async answer(button) {
+  // `extra` goes with the answer (a selector's chosen rows).
+  async answer(button, extra = {}) {
     const d = this.current;
     if (!d || d.answering) return;
     d.answering = true;
@@ -140,7 +146,7 @@ export class Dialogs {
       return;
     }
     try {
-      const body = { button };
+      const body = { ...extra, button };
       if (d.kind === 'input') body.value = value ?? '';
       await this.connection.post(`/api/dialog/${d.id}`, body);
     } catch (e) {
@@ -156,6 +162,7 @@ export class Dialogs {
   finish() {
     const d = this.current;
     this.current = null;
+    if (d && d.kind === 'selector') this.selector?.hide();
     this.element.close();
     this.element.replaceChildren();
     if (d && d.kind === 'notice' && d.control) {

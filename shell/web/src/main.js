@@ -7,9 +7,12 @@ import { Dialogs } from './dialogs.js';
 import { AttributeGrid, hiddenByTree, nodeKeys, renderForm, renderTree, updateForm, valueOf } from './form.js';
 import { ListGrid } from './grid.js';
 import { RowsTable } from './rows.js';
+import { Selector } from './selector.js';
 
 const connection = new Connection();
 const dialogs = new Dialogs(document.getElementById('dialog'), connection);
+// A selector's list is drawn as the lists are, with their quick filter.
+dialogs.selector = new Selector(connection, { quickFilter: (s, g) => quickFilter(s, g), onError: (e) => reportError(e) });
 // id -> { description, tab, view, grids: [ListGrid], form, attributes: [AttributeGrid] }
 const screens = new Map();
 let active = null;
@@ -297,7 +300,8 @@ function render(screen) {
         if (open) execute(screen, 102);
       },
       onTotal: (total) => (footer.textContent = `Записи: ${total.toLocaleString('bg-BG')}`),
-      onError: reportError,
+      // 404: the screen closed while its rows were on their way.
+      onError: (e) => e.status !== 404 && reportError(e),
       onWrite: track,
     };
     if (d.kind === 'detail' && g.editable) callbacks.onCurrent = (key) => chooseRow(screen, g.name, key);
