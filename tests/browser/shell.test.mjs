@@ -18,7 +18,7 @@
 //    million rows paged from the server, sorting, shortcuts, a detail form
 //    with its validation message, questions and input boxes as modal dialogs,
 //    and the release of a closed tab's session.
-import { after, before, describe, test } from 'node:test';
+import { after, afterEach, before, describe, test } from 'node:test';
 import assert from 'node:assert/strict';
 import { spawn } from 'node:child_process';
 import { mkdtempSync, mkdirSync, readFileSync, rmSync } from 'node:fs';
@@ -90,6 +90,12 @@ async function launchBrowser() {
 
 // A field's value once the page has drawn `expected` into it (a reused form
 // is drawn anew a moment after the command that showed it), else what it holds.
+// What the page showed at the end of a test, to see why one failed.
+async function endShot(page, t) {
+  const name = (t?.name ?? 'test').replace(/[^\p{L}\p{N}]+/gu, '-').slice(0, 60);
+  await page?.screenshot({ path: path.join(shotDir, `end-${name}.png`), fullPage: true }).catch(() => {});
+}
+
 async function valueOnceDrawn(field, expected) {
   for (let i = 0; i < 100; i++) {
     if ((await field.inputValue()) === expected) break;
@@ -125,6 +131,7 @@ describe('pelta serve', () => {
     rmSync(work, { recursive: true, force: true });
   });
 
+  afterEach((t) => endShot(page, t));
   const list = () => page.locator('section.screen[data-kind=list]');
   const form = () => page.locator('section.screen[data-kind=detail]');
   const footer = (n) => list().locator('.footer', { hasText: new RegExp(`Записи: ${n}$`) });
@@ -232,8 +239,11 @@ describe('pelta serve', () => {
     const field = (name) => form().locator(`[data-control=${name}]`);
     await find('/0000007');
     await itemsFooter(1).waitFor();
-    const name = (await items.locator('.ag-row[row-index="0"] .ag-cell[col-id="Name"]').textContent()).trim();
-    await items.locator('.ag-row[row-index="0"]').dblclick();
+    // The footer counts the filtered rows before the grid has drawn them.
+    const row = items.locator('.ag-row[row-index="0"]', { hasText: '0000007' });
+    await row.waitFor();
+    const name = (await row.locator('.ag-cell[col-id="Name"]').textContent()).trim();
+    await row.dblclick();
     await form().waitFor();
     assert.equal(await field('txtName').inputValue(), name);
     assert.equal(await field('txtCode').inputValue(), '0000007');
@@ -302,7 +312,8 @@ describe('pelta serve', () => {
     await search.fill('/0000007');
     await search.press('Enter');
     await items.locator('.footer', { hasText: /Записи: 1$/ }).waitFor();
-    await items.locator('.ag-row[row-index="0"]').dblclick();
+    // The footer counts the filtered rows before the grid has drawn them.
+    await items.locator('.ag-row[row-index="0"]', { hasText: '0000007' }).dblclick();
     const detail = page.locator('section.screen[data-kind=detail]:not([hidden])');
     const txtCode = detail.locator('[data-control=txtCode]');
     for (let i = 0; i < 100 && (await txtCode.inputValue()) !== '0000007'; i++) await page.waitForTimeout(50);
@@ -335,6 +346,8 @@ describe('pelta serve', () => {
     await page.locator('.tab', { hasText: 'Продукти и материали' }).click();
     await search.fill('');
     await search.press('Enter');
+  });
+
   test('the producer of an item is chosen in the partners\' list shown in a dialog', async () => {
     const items = page.locator('section.screen[data-kind=list]:not([hidden])');
     const detail = page.locator('section.screen[data-kind=detail]:not([hidden])');
@@ -422,6 +435,7 @@ describe('pelta serve: partners', () => {
     rmSync(work, { recursive: true, force: true });
   });
 
+  afterEach((t) => endShot(page, t));
   const list = () => page.locator('section.screen[data-kind=list]');
   const form = () => page.locator('section.screen[data-kind=detail]');
   const footer = (n) => list().locator('.footer', { hasText: new RegExp(`Записи: ${n}$`) });
