@@ -485,6 +485,8 @@ describe('pelta serve: partners', () => {
     await page.keyboard.press('Control+n');
     await form().waitFor();
     const field = (name) => form().locator(`[data-control=${name}]`);
+    // The form the list reuses is drawn anew for the new partner.
+    assert.equal(await valueOnceDrawn(field('txtName'), ''), '');
     await field('txtAddress').fill('гр. Варна, ул. Тестова 1');
     await page.keyboard.press('Control+s');
     await answerDialog(page, 'Невалидно име', 'OK');

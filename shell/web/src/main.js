@@ -110,8 +110,6 @@ async function save(screen) {
   status('Записване...');
   try {
     const reply = await connection.post(`/api/screens/${screen.description.id}/save`);
-    // The form shows what was saved (a code the service gave, its lists).
-    await showScreen(screen.description.id, false);
     status(reply.unchanged ? 'Няма промени за запис' : reply.saved ? 'Записано' : 'Не е записано');
   } catch (e) {
     status('Не е записано');
