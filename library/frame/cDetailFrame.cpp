@@ -200,6 +200,18 @@ void cDetailFrame::m_oForm_FillControls() {
     }
 }
 
+pelta::Variant cDetailFrame::pvParameter(const char* Name) {
+    if (!m_oConnection) return {};
+    auto params = m_oConnection->AppParameters();
+    if (!params) return {};
+    auto p = params->Item(Name);
+    return p ? p->Value() : pelta::Variant();
+}
+
+std::string cDetailFrame::pvText(const std::string& ControlName) {
+    return C2Str(m_oForm->ControlValue(ControlName));
+}
+
 pelta::Variant cDetailFrame::pvControlField(const std::string& ControlName) {
     pelta::Variant v = m_oForm->ControlValue(ControlName);
     if (v.isEmpty() || (v.isString() && v.str().empty())) return pelta::Variant::null();

@@ -136,6 +136,11 @@ protected:
     // A message about an attribute: its row is chosen first.
     void pvShowAttribMessage(const std::string& Field, const std::string& Text,
                              const std::string& Title = {}, const std::string& Hint = {});
+    // A parameter of the site (the connection's application parameters);
+    // Empty when there is none of that name.
+    pelta::Variant pvParameter(const char* Name);
+    // A control's value as text.
+    std::string pvText(const std::string& ControlName);
     // The value of a control as a head field takes it: Null for an empty one.
     pelta::Variant pvControlField(const std::string& ControlName);
     // Equality as an edit sees it: empty and Null alike, texts by content.

@@ -167,18 +167,6 @@ void frmItemsDetails::pvTakeResponse(pelta::PropertyBag& Response, bool Fetched)
     if (!Fetched) pvBuildTree();
 }
 
-pelta::Variant frmItemsDetails::pvParameter(const char* Name) {
-    if (!m_oConnection) return {};
-    auto params = m_oConnection->AppParameters();
-    if (!params) return {};
-    auto p = params->Item(Name);
-    return p ? p->Value() : pelta::Variant();
-}
-
-std::string frmItemsDetails::pvText(const std::string& ControlName) {
-    return C2Str(m_oForm->ControlValue(ControlName));
-}
-
 pelta::Variant frmItemsDetails::pvDefault(const char* Name, const char* Flag) {
     auto rs = Reference(Name);
     if (!rs || rs->recordCount() == 0 || rs->fieldIndex(Flag) < 0) return {};

@@ -55,8 +55,6 @@ private:
     bool pvCheckHead();
     bool pvCheckLists();
     bool pvCopy();
-    pelta::Variant pvParameter(const char* Name);
-    std::string pvText(const std::string& ControlName);
     std::string pvAttribute(const char* Field);
     pelta::Variant pvDefault(const char* Reference, const char* Flag = "IsDef");
 

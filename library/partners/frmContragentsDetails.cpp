@@ -222,18 +222,6 @@ void frmContragentsDetails::pvTakeResponse(pelta::PropertyBag& Response, bool Fe
     if (Fetched) m_bFromCopy = false;
 }
 
-pelta::Variant frmContragentsDetails::pvParameter(const char* Name) {
-    if (!m_oConnection) return {};
-    auto params = m_oConnection->AppParameters();
-    if (!params) return {};
-    auto p = params->Item(Name);
-    return p ? p->Value() : pelta::Variant();
-}
-
-std::string frmContragentsDetails::pvText(const std::string& ControlName) {
-    return C2Str(m_oForm->ControlValue(ControlName));
-}
-
 void frmContragentsDetails::pvNewRecord() {
     if (m_oCopy) {
         pvTakeCopy();

@@ -50,8 +50,6 @@ private:
     bool pvDimensionModified();
     RecordsetRef pvDefaultDimension();
 
-    pelta::Variant pvParameter(const char* Name);
-    std::string pvText(const std::string& ControlName);
     bool pvIsNaturalPersonType(const std::string& TypeID);
 
     pelta::Ref<ITreeExtender> m_oTreeListsExt;
