@@ -10,6 +10,7 @@
 #include "library/frame/mdErrorHandling.h"
 #include "library/frame/mdGlobals.h"
 #include "library/items/frmItemsAttribs.h"
+#include "library/items/mdLiveRows.h"
 #include "platform/automation/error.h"
 #include "platform/automation/guid.h"
 #include "platform/data/propertybag.h"
@@ -67,15 +68,6 @@ DetailDefinition ItemsDetails() {
     for (const ItemAttribute& a : ItemAttributes())
         d.Attributes.push_back(a.Decl);
     return d;
-}
-
-// Rows not deleted, one at a time.
-template <class F>
-void ForLiveRows(const RecordsetRef& Rows, F&& Visit) {
-    if (!Rows || Rows->recordCount() == 0) return;
-    auto r = Rows->clone();
-    for (r->moveFirst(); !r->eof(); r->moveNext())
-        if (r->status() != pelta::RowStatus::Deleted) Visit(*r);
 }
 
 std::string Trim(const std::string& Text) {

@@ -7,6 +7,7 @@
 #include "library/frame/mdErrorHandling.h"
 #include "library/frame/mdGlobals.h"
 #include "library/items/frmItemsDetails.h"
+#include "library/items/mdLiveRows.h"
 #include "platform/automation/guid.h"
 #include "platform/data/propertybag.h"
 #include "platform/data/recordset.h"
@@ -32,13 +33,12 @@ enum BomCommand : int32_t {
 
 bool frmItemsDetails::BomNameTaken(const RecordsetRef& Boms, const std::string& Name,
                                    const std::string& Except) {
-    if (!Boms || Boms->recordCount() == 0 || Boms->fieldIndex("Name") < 0) return false;
-    auto b = Boms->clone();
-    b->setFilter("Name='" + SqlQuote(Name) + "'");
-    for (b->moveFirst(); !b->eof(); b->moveNext())
-        if (b->status() != pelta::RowStatus::Deleted && C2Str(b->value("ID")) != Except)
-            return true;
-    return false;
+    if (!Boms || Boms->fieldIndex("Name") < 0) return false;
+    bool taken = false;
+    ForLiveRows(
+        Boms, [&](pelta::Recordset& b) { taken = taken || C2Str(b.value("ID")) != Except; },
+        "Name='" + SqlQuote(Name) + "'");
+    return taken;
 }
 
 std::string frmItemsDetails::pvBomOfNode(const std::string& Key) const {
@@ -112,12 +112,7 @@ void frmItemsDetails::pvNewBom() {
     if (!boms || boms->fieldIndex("Name") < 0) return;
     const std::string name = AskBomName(*m_oForm, boms, {}, {});
     if (name.empty()) return;
-    bool first = true;
-    {
-        auto b = boms->clone();
-        for (b->moveFirst(); !b->eof(); b->moveNext())
-            first = first && b->status() == pelta::RowStatus::Deleted;
-    }
+    const bool first = LiveBookmarks(boms).empty();
     const std::string id = pelta::newGuidString();
     auto set = [&](const char* field, const pelta::Variant& v) {
         if (boms->fieldIndex(field) >= 0) boms->setValue(field, v);
@@ -174,13 +169,9 @@ void frmItemsDetails::pvCopyBom() {
     if (boms->fieldIndex("CD") >= 0) boms->setValue("CD", pelta::Variant(pelta::now()));
     boms->update();
     if (auto details = Rows("BomsDetails"); details && details->fieldIndex("Bom_ID") >= 0) {
-        std::vector<pelta::Variant> rows;
         auto d = details->clone();
-        d->setFilter("Bom_ID='" + SqlQuote(bom) + "'");
-        for (d->moveFirst(); !d->eof(); d->moveNext())
-            if (d->status() != pelta::RowStatus::Deleted) rows.push_back(d->bookmark());
-        for (const pelta::Variant& mark : rows) {
-            d->clearFilter();
+        for (const pelta::Variant& mark :
+             LiveBookmarks(details, "Bom_ID='" + SqlQuote(bom) + "'")) {
             d->setBookmark(mark);
             details->addNew();
             for (size_t i = 0; i < details->fieldCount(); ++i) {
@@ -206,12 +197,8 @@ void frmItemsDetails::pvDeleteBom() {
         return;
     if (auto details = Rows("BomsDetails"); details && details->fieldIndex("Bom_ID") >= 0) {
         auto d = details->clone();
-        d->setFilter("Bom_ID='" + SqlQuote(bom) + "'");
-        std::vector<pelta::Variant> rows;
-        for (d->moveFirst(); !d->eof(); d->moveNext())
-            if (d->status() != pelta::RowStatus::Deleted) rows.push_back(d->bookmark());
-        d->clearFilter();
-        for (const pelta::Variant& mark : rows) {
+        for (const pelta::Variant& mark :
+             LiveBookmarks(details, "Bom_ID='" + SqlQuote(bom) + "'")) {
             d->setBookmark(mark);
             d->deleteRecord();
         }
