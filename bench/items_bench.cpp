@@ -27,53 +27,20 @@
 #include "framework/grid_extender.h"
 #include "framework/services.h"
 #include "framework/user_agent.h"
+#include "items_catalogue.h"
 #include "library/frame/mdClassFactory.h"
 #include "library/items/ctxItems.h"
 #include "platform/data/recordset.h"
 
 namespace {
 
-constexpr int kItems = 1000000;
+using benchitems::databasePath;
+using benchitems::kItems;
 
 using Clock = std::chrono::steady_clock;
 
 double seconds(Clock::time_point since) {
     return std::chrono::duration<double>(Clock::now() - since).count();
-}
-
-const std::string& databasePath() {
-    static const std::string path = [] {
-        const char* given = std::getenv("PELTA_ITEMS_BENCH_DB");
-        std::string p =
-            given ? given
-                  : (std::filesystem::temp_directory_path() / "pelta_items_bench_1m.db").string();
-        bool ready = false;
-        if (std::filesystem::exists(p)) {
-            try {
-                auto db = pelta::bll::openDatabase(p);
-                auto st = db->prepare("SELECT COUNT(*) FROM nom_items");
-                ready = st->step() && st->int64(0) == kItems;
-            } catch (const pelta::Error&) {
-                ready = false;
-            }
-            if (!ready)
-                for (const char* suffix : {"", "-wal", "-shm"})
-                    std::filesystem::remove(p + suffix);
-        }
-        if (!ready) {
-            std::fprintf(stderr, "generating %d items into %s ...\n", kItems, p.c_str());
-            const auto t0 = Clock::now();
-            pelta::bll::DemoOptions o;
-            o.banks = 1;
-            o.rateDays = 2;
-            o.currenciesPerRate = 2;
-            o.items = kItems;
-            pelta::bll::createDemoDatabase(p, o);
-            std::fprintf(stderr, "generated in %.1f s\n", seconds(t0));
-        }
-        return p;
-    }();
-    return path;
 }
 
 // The framework and a connection, as the host sets them up once.

@@ -12,6 +12,7 @@
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
+#include <ctime>
 #include <filesystem>
 #include <random>
 
@@ -20,33 +21,15 @@
 #include "framework/framework.h"
 #include "framework/services.h"
 #include "framework/user_agent.h"
+#include "items_catalogue.h"
 #include "library/frame/mdClassFactory.h"
 #include "library/items/frmItemsDetails.h"
 #include "platform/data/recordset.h"
 
 namespace {
 
-constexpr int kItems = 1000000;
-
-const std::string& databasePath() {
-    static const std::string path = [] {
-        const char* given = std::getenv("PELTA_ITEMS_BENCH_DB");
-        std::string p =
-            given ? given
-                  : (std::filesystem::temp_directory_path() / "pelta_items_bench_1m.db").string();
-        if (!std::filesystem::exists(p)) {
-            std::fprintf(stderr, "generating %d items into %s ...\n", kItems, p.c_str());
-            pelta::bll::DemoOptions o;
-            o.banks = 1;
-            o.rateDays = 2;
-            o.currenciesPerRate = 2;
-            o.items = kItems;
-            pelta::bll::createDemoDatabase(p, o);
-        }
-        return p;
-    }();
-    return path;
-}
+using benchitems::databasePath;
+using benchitems::kItems;
 
 struct Host {
     Host() {
@@ -99,11 +82,14 @@ void BM_ShowItem(benchmark::State& state) {
 
 void BM_SaveItemAttribute(benchmark::State& state) {
     auto& form = host().form;
+    const std::string run = std::to_string(std::time(nullptr));
     size_t i = 0;
     for (auto _ : state) {
         state.PauseTiming();
         form->ShowDetail(items()[i % items().size()]);
-        form->Attributes()->UserSetValue("Name2", pelta::Variant("Второ име " + std::to_string(i)));
+        // A value of this run: one the item already holds would save nothing.
+        form->Attributes()->UserSetValue(
+            "Name2", pelta::Variant("Второ име " + run + "/" + std::to_string(i)));
         ++i;
         state.ResumeTiming();
         if (!form->FormExtender()->SaveDocument()) state.SkipWithError("not saved");
